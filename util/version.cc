@@ -1,0 +1,57 @@
+#include "util/version.h"
+
+#include <err.h>
+
+#include <regex>
+#include <stdexcept>
+#include <tuple>
+
+#include "util/pattern.h"
+
+namespace {
+
+const std::regex& version_pattern() {
+  static const std::regex pattern =
+      compile_pattern(R"(([0-9]+)([a-z]+)(?:\.([0-9]+))?(?:\.([0-9]+))?)");
+  return pattern;
+}
+
+// The whole match and four groups.
+constexpr std::size_t version_groups = 5;
+
+// A group that took no part in the match is empty, and not a number.
+std::int32_t number_or_absent(const std::string& digits) {
+  try {
+    return std::stoi(digits);
+  } catch (const std::invalid_argument&) {
+    return olm_version::absent;
+  }
+}
+
+auto in_order(const olm_version& v) { return std::tie(v.year, v.letters, v.major, v.minor); }
+
+}  // namespace
+
+olm_version::olm_version(const std::string& text) { parse(text); }
+
+void olm_version::parse(const std::string& text) {
+  try {
+    std::smatch results;
+    if (!std::regex_match(text, results, version_pattern()) || results.size() != version_groups) {
+      warn("Cannot parse version string %s, results.size() = %d", text.c_str(),
+           static_cast<int>(results.size()));
+      throw std::invalid_argument("no match");
+    }
+    year = std::stoi(results[1]);
+    letters = results[2];
+    major = number_or_absent(results[3]);
+    minor = number_or_absent(results[4]);
+  } catch (const std::invalid_argument&) {
+    warn("Cannot parse version string %s", text.c_str());
+    *this = olm_version();
+  }
+}
+
+bool operator>(const olm_version& a, const olm_version& b) { return in_order(a) > in_order(b); }
+
+bool operator==(const olm_version& a, const olm_version& b) { return in_order(a) == in_order(b); }
