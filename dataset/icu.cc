@@ -1,0 +1,92 @@
+#include "dataset/icu.h"
+
+#include <err.h>
+#include <fts.h>
+#include <sys/stat.h>
+
+#include <cerrno>
+#include <cstring>
+#include <memory>
+#include <regex>
+
+#include "util/filesystem_error.h"
+#include "util/first_word.h"
+#include "util/pattern.h"
+#include "util/primitives.h"
+
+namespace {
+
+struct walk_closer {
+  void operator()(FTS* walk) const noexcept { fts_close(walk); }
+};
+using directory_walk = std::unique_ptr<FTS, walk_closer>;
+
+directory_walk open_walk(std::string directory) {
+  char* const roots[] = {directory.data(), nullptr};
+  directory_walk walk(fts_open(roots, FTS_COMFOLLOW | FTS_PHYSICAL | FTS_XDEV, nullptr));
+  if (walk) return walk;
+  const filesystem_error error = errno;
+  warn("tz_icu::initialize: fts_open of %s failed, %s", directory.c_str(), std::strerror(error));
+  raise_filesystem_error(error);
+}
+
+const std::regex& data_file_name() {
+  static const std::regex pattern = compile_pattern(olm_icu::data_file_pattern);
+  return pattern;
+}
+
+// The root is at level 0, what lies directly in it at level 1.
+bool is_public_file_in_root(const FTSENT& entry) {
+  return entry.fts_errno == 0 && entry.fts_level == 1 && entry.fts_namelen != 0 &&
+         entry.fts_info == FTS_F && (entry.fts_statp->st_mode & S_IROTH) != 0;
+}
+
+}  // namespace
+
+olm_icu::olm_icu() : directory(system_directory) { initialize(); }
+
+olm_icu::olm_icu(const std::string& path)
+    : olm_dataset_component(path),
+      directory(path.empty() ? system_directory : path + "/" + download_directory) {
+  initialize();
+}
+
+void olm_icu::initialize() {
+  if (dataset_path.empty()) {
+    schema = first_word(directory + "/" + schema_file);
+    return;
+  }
+  schema = schema_of_data_file();
+  if (schema.empty()) warn("No ICU schema found for %s", dataset_path.c_str());
+}
+
+std::string olm_icu::schema_of_data_file() const {
+  const directory_walk walk = open_walk(directory);
+  while (const FTSENT* const entry = fts_read(walk.get())) {
+    std::cmatch results;
+    if (is_public_file_in_root(*entry) &&
+        std::regex_match(entry->fts_name, results, data_file_name())) {
+      return results[1];
+    }
+  }
+  return std::string();
+}
+
+bool olm_icu::compatible_schema(const olm_dataset_component& other) const {
+  const auto* const other_icu = dynamic_cast<const olm_icu*>(&other);
+  if (other_icu == nullptr) {
+    warn("olm_icu::compatible_schema: could not dynamic_cast other component");
+    return false;
+  }
+  return schema == other_icu->schema;
+}
+
+void olm_icu::install_link() const {
+  try {
+    primitive::remove(link_path);
+    primitive::remove(legacy_link_path);
+  } catch (...) {
+    warn("unlink of ICU softlink failed");
+  }
+  if (!dataset_path.empty()) primitive::create_symlink(directory, link_path);
+}
