@@ -1,0 +1,29 @@
+#include "driver/link_state.h"
+
+#include <err.h>
+
+#include <string_view>
+
+#include "driver/paths.h"
+#include "util/filesystem_error.h"
+#include "util/primitives.h"
+#include "util/starts_with.h"
+
+std::string read_latest_path() { return primitive::read_symlink(paths::latest_link); }
+
+std::string parse_zoneinfo_link(const std::string& link) {
+  constexpr std::string_view downloads = paths::downloads;
+  if (starts_with(link, downloads)) {
+    // At least one character must stand between the directory's own slash and the last one.
+    const std::size_t last_slash = link.rfind('/');
+    if (last_slash > downloads.size()) return link.substr(0, last_slash);
+  } else if (link == paths::system_zoneinfo) {
+    return std::string();
+  }
+  warn("Bad zoneinfo link %s", link.c_str());
+  throw no_error_number;
+}
+
+std::string read_current_path() {
+  return parse_zoneinfo_link(primitive::read_symlink(paths::zoneinfo_link));
+}
