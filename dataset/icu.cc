@@ -69,7 +69,7 @@ std::string olm_icu::schema_of_data_file() const {
       return results[1];
     }
   }
-  return std::string();
+  return {};
 }
 
 bool olm_icu::compatible_schema(const olm_dataset_component& other) const {

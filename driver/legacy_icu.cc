@@ -24,4 +24,4 @@ void migrate_legacy_icu_link() {
   }
 }
 
-void remove_legacy_icu_entry() { std::remove(paths::legacy_icu_entry); }
+void remove_legacy_icu_entry() { (void)std::remove(paths::legacy_icu_entry); }

@@ -18,7 +18,7 @@ std::string parse_zoneinfo_link(const std::string& link) {
     const std::size_t last_slash = link.rfind('/');
     if (last_slash > downloads.size()) return link.substr(0, last_slash);
   } else if (link == paths::system_zoneinfo) {
-    return std::string();
+    return {};
   }
   warn("Bad zoneinfo link %s", link.c_str());
   throw no_error_number;

@@ -24,7 +24,7 @@ bool keep_or_correct() {
     target.replace(0, old_prefix.size(), paths::zoneinfo_link);
     warn("Correcting localtime link to %s", target.c_str());
     if (!primitive::exists(target)) return false;
-    std::remove(paths::localtime_link);
+    (void)std::remove(paths::localtime_link);
     primitive::create_symlink(target, paths::localtime_link);
     return true;
   } catch (...) {
@@ -34,7 +34,7 @@ bool keep_or_correct() {
 
 void reset_to_default_zone() {
   warn("localtime link invalid; resetting to %s", default_zone);
-  std::remove(paths::localtime_link);
+  (void)std::remove(paths::localtime_link);
   primitive::create_symlink(std::string(paths::zoneinfo_link) + "/" + default_zone,
                             paths::localtime_link);
 }

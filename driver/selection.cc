@@ -20,7 +20,7 @@ std::string valid_current_path() {
     warn("Invalid current symlinks; resetting to system partition");
   }
   reset_to_system();
-  return std::string();
+  return {};
 }
 
 void select_and_install_or_raise() {

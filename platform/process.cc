@@ -5,6 +5,6 @@
 #include <exception>
 
 void prepare_process() noexcept {
-  std::signal(SIGPIPE, SIG_IGN);
+  (void)std::signal(SIGPIPE, SIG_IGN);
   std::set_terminate([] { std::_Exit(EXIT_FAILURE); });
 }

@@ -12,23 +12,24 @@ fail() {
 # can't.
 need_packages() {
   local package missing=() as_root=()
-  command -v dpkg-query >/dev/null && command -v apt-get >/dev/null ||
-    fail "this needs a Debian machine, with: $*"
+  for package in dpkg-query apt-get; do
+    command -v "$package" >/dev/null || fail "not a Debian machine; install by hand: $*"
+  done
   for package in "$@"; do
     [ "$(dpkg-query -W -f '${db:Status-Status}' "$package" 2>/dev/null)" = installed ] ||
       missing+=("$package")
   done
   [ ${#missing[@]} -gt 0 ] || return 0
   if [ "$(id -u)" != 0 ]; then
-    command -v sudo >/dev/null ||
-      fail "packages are missing; run as root: apt-get install ${missing[*]}"
+    command -v sudo >/dev/null || fail "not root; run as root: apt-get install ${missing[*]}"
     as_root=(sudo)
   fi
   echo "Installing what is missing: ${missing[*]}"
-  "${as_root[@]}" apt-get update -qq >&2 &&
-    "${as_root[@]}" env DEBIAN_FRONTEND=noninteractive \
-      apt-get install -y -qq --no-install-recommends "${missing[@]}" >/dev/null ||
-    fail "could not install them; run as root: apt-get install ${missing[*]}"
+  if ! "${as_root[@]}" apt-get update -qq >&2 ||
+    ! "${as_root[@]}" env DEBIAN_FRONTEND=noninteractive \
+      apt-get install -y -qq --no-install-recommends "${missing[@]}" >/dev/null; then
+    fail "that failed; run as root: apt-get install ${missing[*]}"
+  fi
 }
 
 # Configures and builds the preset $1; shows the output only when that fails, and warnings always.

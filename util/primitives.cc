@@ -8,6 +8,13 @@
 
 #include "util/filesystem_error.h"
 
+namespace {
+
+// In bytes; what is longer is cut.
+constexpr std::size_t longest_link_text = 1024;
+
+}  // namespace
+
 namespace primitive {
 
 void remove(const std::string& path) {
@@ -20,10 +27,10 @@ void remove(const std::string& path) {
 bool exists(const std::string& path) noexcept { return access(path.c_str(), F_OK) == 0; }
 
 std::string read_symlink(const std::string& path) {
-  std::array<char, 1024> text;
+  std::array<char, longest_link_text> text;
   const ssize_t length = readlink(path.c_str(), text.data(), text.size());
-  if (length >= 0) return std::string(text.data(), static_cast<std::size_t>(length));
-  if (errno == ENOENT) return std::string();
+  if (length >= 0) return {text.data(), static_cast<std::size_t>(length)};
+  if (errno == ENOENT) return {};
   const filesystem_error error = errno;
   warn("read_symlink: %s", path.c_str());
   raise_filesystem_error(error);
