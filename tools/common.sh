@@ -1,6 +1,7 @@
 # What the commands in this folder share. To be sourced.
 # shellcheck shell=bash
 
+export LC_ALL=C
 project=$(cd "$(dirname "${BASH_SOURCE[0]}")/.." && pwd)
 
 fail() {
