@@ -30,8 +30,8 @@ directory_walk open_walk(std::string directory) {
   raise_filesystem_error(error);
 }
 
-const std::regex& data_file_name() {
-  static const std::regex pattern = compile_pattern(olm_icu::data_file_pattern);
+const olm_pattern& data_file_name() {
+  static const olm_pattern pattern = compile_pattern(olm_icu::data_file_pattern);
   return pattern;
 }
 

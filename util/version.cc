@@ -10,8 +10,8 @@
 
 namespace {
 
-const std::regex& version_pattern() {
-  static const std::regex pattern =
+const olm_pattern& version_pattern() {
+  static const olm_pattern pattern =
       compile_pattern(R"(([0-9]+)([a-z]+)(?:\.([0-9]+))?(?:\.([0-9]+))?)");
   return pattern;
 }
@@ -19,13 +19,8 @@ const std::regex& version_pattern() {
 // The whole match and four groups.
 constexpr std::size_t version_groups = 5;
 
-// A group that took no part in the match is empty, and not a number.
-std::int32_t number_or_absent(const std::string& digits) {
-  try {
-    return std::stoi(digits);
-  } catch (const std::invalid_argument&) {
-    return olm_version::absent;
-  }
+std::int32_t number_or_absent(const std::ssub_match& digits) {
+  return digits.matched ? std::stoi(digits) : olm_version::absent;
 }
 
 auto in_order(const olm_version& v) { return std::tie(v.year, v.letters, v.major, v.minor); }
