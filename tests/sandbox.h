@@ -37,7 +37,7 @@ class sandbox : public ::testing::Test {
   static void put(const tree& entries);  // with the parent directories
   static tree look();                    // all that is in /usr and /var
 
-  // Calls `body` in a process of its own, ended by force after a minute. The status is what
+  // Calls `body` in a process of its own, ended by force after 20 seconds. The status is what
   // `body` returns or the number that it raises, `other_error` where it raises something else.
   static constexpr int other_error = 99;
   static outcome run(const std::function<int()>& body);
