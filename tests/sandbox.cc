@@ -114,13 +114,14 @@ outcome sandbox::run(const std::function<int()>& body) {
     const int file = open(output, O_WRONLY | O_CREAT | O_TRUNC, 0644);
     for (const int standard : {STDOUT_FILENO, STDERR_FILENO}) dup2(file, standard);
     close(file);
+    int status = other_error;
     try {
-      std::exit(body());
+      status = body();
     } catch (int error) {
-      std::exit(error);
+      status = error;
     } catch (...) {
-      std::exit(other_error);
     }
+    std::exit(status);
   }
   int status = 0;
   waitpid(child, &status, 0);
