@@ -92,7 +92,7 @@ lines sandbox::run(const std::function<int()>& body) {
   std::fflush(stdout);
   const pid_t child = fork();
   if (child == 0) {
-    alarm(20);
+    alarm(120);
     const int file = open(output, O_WRONLY | O_CREAT | O_TRUNC, 0644);
     for (const int standard : {STDOUT_FILENO, STDERR_FILENO}) dup2(file, standard);
     close(file);

@@ -31,7 +31,7 @@ class sandbox : public ::testing::Test {
   static void put(const tree& entries);  // with the parent directories
   static tree look();                    // all that is in /usr and /var
 
-  // Calls `body` in a process of its own, ended by force after 20 seconds.
+  // Calls `body` in a process of its own, ended by force after two minutes.
   static lines run(const std::function<int()>& body);
   // Runs the program, after `before` in its process.
   static lines boot(const std::function<void()>& before = [] {});
