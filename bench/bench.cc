@@ -148,7 +148,7 @@ int main(int argc, char** argv) {
   benchmark::Initialize(&argc, argv);
   benchmark::CPUInfo::Get();
   const char* const root = std::getenv("OLMBOOT_ROOT");
-  if (root == nullptr || chdir(root) != 0 || chroot(".") != 0) {
+  if (root == nullptr || chdir(root) != 0 || chroot(".") != 0 || !fs::exists("/throw-away")) {
     std::fputs("not in a throw-away root; use tools/bench\n", stderr);
     return EXIT_FAILURE;
   }

@@ -1,6 +1,8 @@
 #include <sys/xattr.h>
 #include <unistd.h>
 
+#include <cstdlib>
+
 #include "sandbox.h"
 
 namespace {
@@ -9,7 +11,9 @@ using platform_test = sandbox;
 
 void lose_the_reader() {
   int ends[2];
-  if (pipe(ends) == 0) dup2(ends[1], STDERR_FILENO), close(ends[0]), close(ends[1]);
+  if (pipe(ends) != 0) std::abort();
+  dup2(ends[1], STDERR_FILENO);
+  close(ends[0]);
 }
 void close_all() {
   for (const int standard : {0, 1, 2}) close(standard);

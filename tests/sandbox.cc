@@ -44,7 +44,7 @@ sandbox::sandbox() {
     const char* const root = std::getenv("OLMBOOT_ROOT");
     // The leak check at the end needs /proc.
     std::atexit([] { fchdir(outside) == 0 && chroot(".") == 0; });
-    return root != nullptr && chdir(root) == 0 && chroot(".") == 0;
+    return root != nullptr && chdir(root) == 0 && chroot(".") == 0 && fs::exists("/throw-away");
   }();
   if (!entered) std::exit((std::fputs("not in a throw-away root; use tools/in_root\n", stderr), 1));
   clear();

@@ -44,7 +44,8 @@ build_preset() {
   [ $status = 0 ] || fail "the build of preset '$1' failed"
 }
 
-# Makes an empty throw-away root, names it in $root, and removes it when the script ends.
+# Makes an empty throw-away root, names it in $root, and removes it when the script ends. What works
+# in it looks for the mark first.
 make_root() {
   root=$(mktemp -d)
   chmod 755 "$root"
@@ -52,6 +53,7 @@ make_root() {
   trap 'exit 129' HUP
   trap 'exit 130' INT
   trap 'exit 143' TERM
+  touch "$root/throw-away"
   mkdir -p "$root/tmp" "$root/usr/share/icu" "$root/usr/share/zoneinfo.default" \
     "$root/var/db/timezone/tz"
 }
