@@ -13,6 +13,7 @@
 #include <cstdlib>
 #include <filesystem>
 #include <fstream>
+#include <limits>
 #include <string>
 #include <vector>
 
@@ -90,8 +91,9 @@ double time_of(const char* path, boot kind) {
   return time.count();
 }
 
-// Runs `path` and returns the most memory that it held, in KiB, as it is about to end. A child's
-// resource usage would tell that of this process, which it was before it became `path`.
+// Runs `path` and returns the most memory that it held, in KiB, as it is about to end; not a number
+// where it may not be traced. A child's resource usage would tell that of this process, which it
+// was before it became `path`.
 double peak_memory_of(const char* path, boot kind) {
   rewind(kind);
   const pid_t child = fork();
@@ -114,7 +116,8 @@ double peak_memory_of(const char* path, boot kind) {
   waitpid(child, &status, 0);
   const std::string seen(text, length > 0 ? static_cast<std::size_t>(length) : 0);
   const std::size_t at = seen.find("VmHWM:");
-  return at == std::string::npos ? 0 : std::stod(seen.substr(at + 6));
+  if (at == std::string::npos) return std::numeric_limits<double>::quiet_NaN();
+  return std::stod(seen.substr(at + 6));
 }
 
 double median_of(std::vector<double> values) {

@@ -44,6 +44,7 @@ lines unparsed(const std::string& text) {
   const std::string line = "Cannot parse version string " + text;
   return {line + ", results.size() = 0", line};
 }
+
 class driver_test : public sandbox {
  protected:
   // Runs the program on a device at rest changed by `device`. The run must print `expected` and
