@@ -10,17 +10,15 @@
 #include "dataset/zoneinfo.h"
 #include "util/starts_with.h"
 
-olm_dataset::olm_dataset() { create_components(); }
-
 olm_dataset::olm_dataset(const std::string& directory) : path(directory) { create_components(); }
 
 void olm_dataset::create_components() {
-  constexpr std::string_view downloads = downloads_directory;
+  constexpr std::string_view root = downloads_root;
   const auto zoneinfo = std::make_shared<const olm_zoneinfo>(path);
   if (path.empty()) {
     version_text = zoneinfo->get_file_version() + system_version_suffix;
-  } else if (path.size() > downloads.size() && starts_with(path, downloads)) {
-    version_text = path.substr(downloads.size());
+  } else if (path.size() > root.size() && starts_with(path, root)) {
+    version_text = path.substr(root.size());
   } else {
     warn("olm_dataset::create_components: bad path %s", path.c_str());
     throw std::invalid_argument("badpath");

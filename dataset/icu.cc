@@ -9,10 +9,9 @@
 #include <memory>
 #include <regex>
 
-#include "util/filesystem_error.h"
-#include "util/first_word.h"
 #include "util/pattern.h"
 #include "util/primitives.h"
+#include "util/regular_file.h"
 
 namespace {
 
@@ -26,12 +25,14 @@ directory_walk open_walk(std::string directory) {
   directory_walk walk(fts_open(roots, FTS_COMFOLLOW | FTS_PHYSICAL | FTS_XDEV, nullptr));
   if (walk) return walk;
   const filesystem_error error = errno;
+  // This class had the name in the message before; whoever searches for the message knows that one.
   warn("tz_icu::initialize: fts_open of %s failed, %s", directory.c_str(), std::strerror(error));
-  raise_filesystem_error(error);
+  throw_filesystem_error(error);
 }
 
-const olm_pattern& data_file_name() {
-  static const olm_pattern pattern = compile_pattern(olm_icu::data_file_pattern);
+// What a download's data file is named; the group is the schema.
+const olm_pattern& data_file_pattern() {
+  static const olm_pattern pattern = compile_pattern(R"(icutz([0-9]+[lbe])\.dat)");
   return pattern;
 }
 
@@ -43,17 +44,15 @@ bool is_public_file_in_root(const FTSENT& entry) {
 
 }  // namespace
 
-olm_icu::olm_icu() : directory(system_directory) { initialize(); }
-
 olm_icu::olm_icu(const std::string& path)
     : olm_dataset_component(path),
-      directory(path.empty() ? system_directory : path + "/" + download_directory) {
+      directory(path.empty() ? system_directory : path + "/" + subdirectory) {
   initialize();
 }
 
 void olm_icu::initialize() {
   if (dataset_path.empty()) {
-    schema = first_word(directory + "/" + schema_file);
+    schema = read_first_word(directory + "/" + schema_file);
     return;
   }
   schema = schema_of_data_file();
@@ -65,7 +64,7 @@ std::string olm_icu::schema_of_data_file() const {
   while (const FTSENT* const entry = fts_read(walk.get())) {
     std::cmatch results;
     if (is_public_file_in_root(*entry) &&
-        std::regex_match(entry->fts_name, results, data_file_name())) {
+        std::regex_match(entry->fts_name, results, data_file_pattern())) {
       return results[1];
     }
   }

@@ -4,47 +4,43 @@
 
 #include "dataset/component.h"
 
-// The ICU time zone resource files of one data set. Their format is named by the schema, a token
-// such as 44l: ICU's data version and the letter of its byte order and character family. It is only
-// ever compared as text.
+// The ICU time zone resource files of one data set. The schema names their format: a token such as
+// 44l, ICU's data version and the letter of its byte order and character family. It is only ever
+// compared as text.
 class olm_icu final : public olm_dataset_component {
  public:
-  // The directory that is built into the system.
+  // The system data set's directory. Never written, and no link leads to it.
   static constexpr char system_directory[] = "/usr/share/icu";
   // The file in it whose first word is the system's schema.
   static constexpr char schema_file[] = "icutzformat.txt";
-  // The directory's name in the directory of a download.
-  static constexpr char download_directory[] = "icutz";
-  // What the name of a download's data file is; the group is the download's schema.
-  static constexpr char data_file_pattern[] = R"(icutz([0-9]+[lbe])\.dat)";
-  // The link that names the active download's directory.
+  // The directory's name in a download's directory.
+  static constexpr char subdirectory[] = "icutz";
+  // The link to the active download's directory; absent while the system data set is active.
   static constexpr char link_path[] = "/var/db/timezone/icutz";
-  // Where that link was in older systems.
+  // Where that link was on older systems.
   static constexpr char legacy_link_path[] = "/var/db/icutz";
 
-  // The system data set's files.
-  olm_icu();
-  // The files of the data set at `path`; the system data set's where that is empty. The schema
-  // stays empty where none is found, for a download with
+  // The files of the data set at `path`; the system data set's if that is empty. The schema stays
+  // empty when none is found. For a download that prints
   //   "No ICU schema found for PATH"
-  // For a download, prints "tz_icu::initialize: fts_open of DIRECTORY failed, REASON" and raises
+  // For a download, prints "tz_icu::initialize: fts_open of DIRECTORY failed, REASON" and throws
   // filesystem_error when the walk of its directory can't be started.
-  explicit olm_icu(const std::string& path);
+  explicit olm_icu(const std::string& path = {});
 
   // Returns whether `other` is an ICU component too and has the same schema.
   // Prints "olm_icu::compatible_schema: could not dynamic_cast other component" for another kind.
   bool compatible_schema(const olm_dataset_component& other) const override;
 
-  // Removes the link, at both places, and makes it anew for a download only.
-  // Prints "unlink of ICU softlink failed" when one can't be removed, and goes on; a failure of the
-  // first leaves the legacy one untried.
-  // Raises filesystem_error when the new one can't be made.
+  // Removes the link, then the one in its legacy place; then makes the link, for a download only.
+  // Prints "unlink of ICU softlink failed" when one can't be removed, and goes on; if that is the
+  // first, the legacy one is not tried.
+  // Throws filesystem_error when the new one can't be made.
   void install_link() const override;
 
  private:
   void initialize();
-  // Returns the schema in the name of the first data file that the walk of `directory` comes to: a
-  // regular file directly in it which others may read. Empty when there is none.
+  // Returns the schema in the name of the first data file that the walk of `directory` delivers: a
+  // regular file directly in it that others may read. Returns the empty string when there is none.
   std::string schema_of_data_file() const;
 
   std::string schema;

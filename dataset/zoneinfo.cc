@@ -2,18 +2,16 @@
 
 #include <err.h>
 
-#include "util/first_word.h"
 #include "util/primitives.h"
-
-olm_zoneinfo::olm_zoneinfo() : directory(system_directory) { initialize(); }
+#include "util/regular_file.h"
 
 olm_zoneinfo::olm_zoneinfo(const std::string& path)
     : olm_dataset_component(path),
-      directory(path.empty() ? system_directory : path + "/" + download_directory) {
+      directory(path.empty() ? system_directory : path + "/" + subdirectory) {
   initialize();
 }
 
-void olm_zoneinfo::initialize() { file_version = first_word(directory + "/" + version_file); }
+void olm_zoneinfo::initialize() { file_version = read_first_word(directory + "/" + version_file); }
 
 std::string olm_zoneinfo::get_file_version() const { return file_version; }
 
@@ -23,6 +21,7 @@ void olm_zoneinfo::install_link() const {
   try {
     primitive::remove(link_path);
   } catch (...) {
+    // A capital here and none in the ICU component's message: both are searched for as they are.
     warn("Unlink of zoneinfo softlink failed");
   }
   primitive::create_symlink(directory, link_path);

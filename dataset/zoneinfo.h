@@ -7,30 +7,29 @@
 // The compiled tz database tree of one data set.
 class olm_zoneinfo final : public olm_dataset_component {
  public:
-  // The tree that is built into the system.
+  // The system data set's tree. Never written.
   static constexpr char system_directory[] = "/usr/share/zoneinfo.default";
-  // The tree's name in the directory of a download.
-  static constexpr char download_directory[] = "zoneinfo";
+  // The tree's name in a download's directory.
+  static constexpr char subdirectory[] = "zoneinfo";
   // The file in a tree whose first word is the tree's release.
   static constexpr char version_file[] = "+VERSION";
-  // The link that names the active tree.
+  // The link to the active tree.
   static constexpr char link_path[] = "/var/db/timezone/zoneinfo";
 
-  // The system data set's tree.
-  olm_zoneinfo();
-  // The tree of the data set at `path`; the system data set's where that is empty. The tree need
-  // not exist. Prints nothing.
-  explicit olm_zoneinfo(const std::string& path);
+  // The tree of the data set at `path`; the system data set's if that is empty. The tree need not
+  // exist. Prints nothing. Throws only std::bad_alloc.
+  explicit olm_zoneinfo(const std::string& path = {});
 
-  // Returns the first word of the tree's version file; empty when there is none.
+  // Returns the first word of the tree's version file; the empty string when there is none.
   std::string get_file_version() const;
 
-  // Returns true: any tree fits any system.
+  // Returns true: any tree is compatible with any system.
   bool compatible_schema(const olm_dataset_component& other) const override;
 
-  // Replaces the link by one to this tree. For a moment there is none.
+  // Replaces the link by one to this tree. The old one is removed first: symlink(2) replaces
+  // nothing.
   // Prints "Unlink of zoneinfo softlink failed" when the old one can't be removed, and goes on.
-  // Raises filesystem_error when the new one can't be made.
+  // Throws filesystem_error when the new one can't be made.
   void install_link() const override;
 
  private:

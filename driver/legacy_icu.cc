@@ -4,24 +4,28 @@
 
 #include <cstdio>
 
+#include "dataset/icu.h"
 #include "driver/paths.h"
 #include "util/primitives.h"
 
 void migrate_legacy_icu_link() {
-  if (primitive::exists(paths::legacy_icu_link) && !primitive::exists(paths::icu_link)) {
+  constexpr auto& old_link = olm_icu::legacy_link_path;
+  constexpr auto& new_link = olm_icu::link_path;
+  if (primitive::exists(old_link) && !primitive::exists(new_link)) {
     try {
-      primitive::create_symlink(primitive::read_symlink(paths::legacy_icu_link), paths::icu_link);
+      primitive::create_symlink(primitive::read_symlink(old_link), new_link);
     } catch (...) {
+      // Written out, to be found by what is printed.
       warn("Could not migrate /var/db/icutz to /var/db/timezone/icutz");
     }
   }
-  if (primitive::exists(paths::legacy_icu_link)) {
+  if (primitive::exists(old_link)) {
     try {
-      primitive::remove(paths::legacy_icu_link);
+      primitive::remove(old_link);
     } catch (...) {
       warn("Could not remove /var/db/icutz");
     }
   }
 }
 
-void remove_legacy_icu_entry() { (void)std::remove(paths::legacy_icu_entry); }
+void remove_legacy_icu_entry() noexcept { (void)std::remove(paths::legacy_icu_entry); }

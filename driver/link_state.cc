@@ -4,20 +4,21 @@
 
 #include <string_view>
 
+#include "dataset/dataset.h"
+#include "dataset/zoneinfo.h"
 #include "driver/paths.h"
-#include "util/filesystem_error.h"
 #include "util/primitives.h"
 #include "util/starts_with.h"
 
 std::string read_latest_path() { return primitive::read_symlink(paths::latest_link); }
 
 std::string parse_zoneinfo_link(const std::string& link) {
-  constexpr std::string_view downloads = paths::downloads;
-  if (starts_with(link, downloads)) {
-    // At least one character must stand between the directory's own slash and the last one.
+  constexpr std::string_view root = olm_dataset::downloads_root;
+  if (starts_with(link, root)) {
+    // At least one character must stand between the root's own slash and the last one.
     const std::size_t last_slash = link.rfind('/');
-    if (last_slash > downloads.size()) return link.substr(0, last_slash);
-  } else if (link == paths::system_zoneinfo) {
+    if (last_slash > root.size()) return link.substr(0, last_slash);
+  } else if (link == olm_zoneinfo::system_directory) {
     return {};
   }
   warn("Bad zoneinfo link %s", link.c_str());
@@ -25,5 +26,5 @@ std::string parse_zoneinfo_link(const std::string& link) {
 }
 
 std::string read_current_path() {
-  return parse_zoneinfo_link(primitive::read_symlink(paths::zoneinfo_link));
+  return parse_zoneinfo_link(primitive::read_symlink(olm_zoneinfo::link_path));
 }

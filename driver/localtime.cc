@@ -6,6 +6,7 @@
 #include <string>
 #include <string_view>
 
+#include "dataset/zoneinfo.h"
 #include "driver/paths.h"
 #include "util/primitives.h"
 #include "util/starts_with.h"
@@ -14,33 +15,33 @@ namespace {
 
 constexpr char default_zone[] = "America/Los_Angeles";
 
+// Removes first, as everywhere: symlink(2) replaces nothing.
+void replace_link(const std::string& target) {
+  (void)std::remove(paths::localtime_link);
+  primitive::create_symlink(target, paths::localtime_link);
+}
+
 // Returns whether the link is good, as it was or after correction.
 bool keep_or_correct() {
   constexpr std::string_view old_prefix = paths::legacy_zoneinfo_prefix;
   try {
     std::string target = primitive::read_symlink(paths::localtime_link);
-    if (starts_with(target, paths::zoneinfo_link)) return true;
+    if (starts_with(target, olm_zoneinfo::link_path)) return true;
     if (!starts_with(target, old_prefix)) return false;
-    target.replace(0, old_prefix.size(), paths::zoneinfo_link);
+    target.replace(0, old_prefix.size(), olm_zoneinfo::link_path);
     warn("Correcting localtime link to %s", target.c_str());
     if (!primitive::exists(target)) return false;
-    (void)std::remove(paths::localtime_link);
-    primitive::create_symlink(target, paths::localtime_link);
+    replace_link(target);
     return true;
   } catch (...) {
-    return false;  // the primitive that failed has said why
+    return false;  // the primitive that failed has printed the cause
   }
-}
-
-void reset_to_default_zone() {
-  warn("localtime link invalid; resetting to %s", default_zone);
-  (void)std::remove(paths::localtime_link);
-  primitive::create_symlink(std::string(paths::zoneinfo_link) + "/" + default_zone,
-                            paths::localtime_link);
 }
 
 }  // namespace
 
 void repair_localtime_link() {
-  if (!keep_or_correct()) reset_to_default_zone();
+  if (keep_or_correct()) return;
+  warn("localtime link invalid; resetting to %s", default_zone);
+  replace_link(std::string(olm_zoneinfo::link_path) + "/" + default_zone);
 }

@@ -1,11 +1,11 @@
 #include "driver/legacy_icu.h"
 #include "driver/localtime.h"
+#include "driver/process.h"
 #include "driver/selection.h"
 #include "driver/storage.h"
-#include "platform/process.h"
 
-// One run. Each step reports its own failures and lets the next ones run; an error that a step has
-// no answer to ends the run there with status 1.
+// One run. Each step reports its own failures and the next one runs all the same. An exception that
+// escapes a step ends the run with status 1.
 int main() {
   prepare_process();
   prepare_storage();

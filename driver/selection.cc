@@ -12,21 +12,21 @@ namespace {
 
 void reset_to_system() { olm_dataset().install_links(); }
 
-// Returns the data set that the links name, after a reset the system's.
-std::string valid_current_path() {
+// Returns the directory of the data set that the links name; after a reset, the system data set's.
+std::string current_path_or_reset() {
   try {
     return read_current_path();
   } catch (...) {
     warn("Invalid current symlinks; resetting to system partition");
+    reset_to_system();
+    return {};
   }
-  reset_to_system();
-  return {};
 }
 
-void select_and_install_or_raise() {
+void select_and_install_or_throw() {
   const olm_dataset system;
   const std::string latest_path = read_latest_path();
-  const olm_dataset current(valid_current_path());
+  const olm_dataset current(current_path_or_reset());
 
   const bool current_stays = current.compatible_with(system) && !system.newer_than(current);
   if (!current_stays) {
@@ -37,7 +37,7 @@ void select_and_install_or_raise() {
 
   if (latest_path.empty()) return;
   const olm_dataset update(latest_path);
-  // Against the data set that was current, even when it has just been given up.
+  // Compared with what was current at the start, even if that has just been given up.
   if (update.compatible_with(system) && update.newer_than(current)) {
     update.install_links();
     write_record(active.version_string(), update.version_string());
@@ -51,10 +51,9 @@ void select_and_install_or_raise() {
 
 void select_and_install() {
   try {
-    select_and_install_or_raise();
-    return;
+    select_and_install_or_throw();
   } catch (...) {
     warn("Unable to locate data; resetting to system partition");
+    reset_to_system();
   }
-  reset_to_system();
 }

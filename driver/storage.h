@@ -1,6 +1,6 @@
 #pragma once
 
-// Puts the program's two directories into data protection class D, so that they can be used before
-// the device is first unlocked. One that can't be opened is passed over.
-// Prints nothing and raises nothing but lack of memory.
-void prepare_storage();
+// Puts the program's own directory and that of the downloads into data protection class D, so that
+// they can be used before the device is first unlocked. A directory that can't be opened is skipped.
+// Prints nothing and throws nothing.
+void prepare_storage() noexcept;

@@ -3,9 +3,8 @@
 olm_pattern compile_pattern(const char* pattern) {
   auto options = olm_pattern::ECMAScript;
 #ifdef __GLIBCXX__
-  // This library's usual matcher calls itself once for every character, so that a long word
-  // overflows the stack. With this option of its own it walks the word once, in a loop; what
-  // matches stays the same.
+  // libstdc++'s default matcher recurses once per character and overflows the stack on long words;
+  // __polynomial doesn't, and matches the same.
   options |= std::regex_constants::__polynomial;
 #endif
   return olm_pattern(pattern, options);

@@ -2,10 +2,21 @@
 
 #include <regex>
 
-// The standard library's traits without two questions to the locale, which compiling asks for every
-// character there is: whether it is in a class such as [:alpha:], and what it is equivalent to. The
-// patterns here name neither, and the answers would take longer than all else that a run computes.
+// The standard library's traits without its questions to the locale. While it compiles a set, the
+// library asks for every character whether it is in a class and what it is equivalent to; the
+// answers would take longer than everything else that a run computes. A pattern must therefore do
+// without what needs them. The library is made to refuse a class or a named character where it asks
+// for one by name; the others give wrong matches.
 struct olm_pattern_traits : std::regex_traits<char> {
+  template <typename iterator>
+  char_class_type lookup_classname(iterator /*first*/, iterator /*last*/,
+                                   bool /*ignore_case*/ = false) const {
+    return {};
+  }
+  template <typename iterator>
+  string_type lookup_collatename(iterator /*first*/, iterator /*last*/) const {
+    return {};
+  }
   bool isctype(char /*character*/, char_class_type /*mask*/) const { return false; }
   template <typename iterator>
   string_type transform_primary(iterator /*first*/, iterator /*last*/) const {
@@ -15,7 +26,8 @@ struct olm_pattern_traits : std::regex_traits<char> {
 
 using olm_pattern = std::basic_regex<char, olm_pattern_traits>;
 
-// Returns `pattern` compiled, by the ECMAScript grammar. To be done when a run first needs it, and
-// once.
-// Prints nothing; raises std::regex_error for a malformed pattern.
+// Returns `pattern` compiled by the ECMAScript grammar. It may hold characters, sets and ranges of
+// them, groups, alternatives and repetition, but nothing that depends on a class: no \d, \s, \w,
+// \b, [[:alpha:]], [[=a=]] or [[.a.]]. To be called when a run first needs the pattern, and once.
+// Prints nothing. Throws std::regex_error for a malformed pattern.
 olm_pattern compile_pattern(const char* pattern);

@@ -20,7 +20,8 @@ std::int32_t number_or_absent(const std::ssub_match& digits) {
   return digits.matched ? std::stoi(digits) : olm_version::absent;
 }
 
-auto in_order(const olm_version& v) { return std::tie(v.year, v.letters, v.major, v.minor); }
+// What versions are compared by, in this order.
+auto ordering_key(const olm_version& v) { return std::tie(v.year, v.letters, v.major, v.minor); }
 
 }  // namespace
 
@@ -44,6 +45,6 @@ void olm_version::parse(const std::string& text) {
   }
 }
 
-bool operator>(const olm_version& a, const olm_version& b) { return in_order(a) > in_order(b); }
+bool operator>(const olm_version& a, const olm_version& b) { return ordering_key(a) > ordering_key(b); }
 
-bool operator==(const olm_version& a, const olm_version& b) { return in_order(a) == in_order(b); }
+bool operator==(const olm_version& a, const olm_version& b) { return ordering_key(a) == ordering_key(b); }

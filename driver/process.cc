@@ -1,4 +1,4 @@
-#include "platform/process.h"
+#include "driver/process.h"
 
 #include <csignal>
 #include <cstdlib>
@@ -6,5 +6,6 @@
 
 void prepare_process() noexcept {
   (void)std::signal(SIGPIPE, SIG_IGN);
+  (void)std::signal(SIGXFSZ, SIG_IGN);
   std::set_terminate([] { std::_Exit(EXIT_FAILURE); });
 }

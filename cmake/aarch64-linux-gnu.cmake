@@ -1,0 +1,10 @@
+# Builds for 64 bit ARM with Debian's g++-aarch64-linux-gnu. To build for another target, copy this
+# file and change the names.
+set(CMAKE_SYSTEM_NAME Linux)
+set(CMAKE_SYSTEM_PROCESSOR aarch64)
+set(CMAKE_C_COMPILER aarch64-linux-gnu-gcc)
+set(CMAKE_CXX_COMPILER aarch64-linux-gnu-g++)
+# Runs the tests, with the target's libraries that the compiler brings.
+set(CMAKE_CROSSCOMPILING_EMULATOR qemu-aarch64-static -L /usr/aarch64-linux-gnu)
+# What the Debian package says of the target.
+set(CPACK_DEBIAN_PACKAGE_ARCHITECTURE arm64)

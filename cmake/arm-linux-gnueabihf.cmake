@@ -1,0 +1,10 @@
+# Builds for 32 bit ARM with Debian's g++-arm-linux-gnueabihf. To build for another target, copy this
+# file and change the names.
+set(CMAKE_SYSTEM_NAME Linux)
+set(CMAKE_SYSTEM_PROCESSOR armv7l)
+set(CMAKE_C_COMPILER arm-linux-gnueabihf-gcc)
+set(CMAKE_CXX_COMPILER arm-linux-gnueabihf-g++)
+# Runs the tests, with the target's libraries that the compiler brings.
+set(CMAKE_CROSSCOMPILING_EMULATOR qemu-arm-static -L /usr/arm-linux-gnueabihf)
+# What the Debian package says of the target.
+set(CPACK_DEBIAN_PACKAGE_ARCHITECTURE armhf)
