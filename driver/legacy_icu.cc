@@ -9,8 +9,8 @@
 #include "util/primitives.h"
 
 void migrate_legacy_icu_link() {
-  constexpr auto& old_link = olm_icu::legacy_link_path;
-  constexpr auto& new_link = olm_icu::link_path;
+  constexpr const char* old_link = olm_icu::legacy_link_path;
+  constexpr const char* new_link = olm_icu::link_path;
   if (primitive::exists(old_link) && !primitive::exists(new_link)) {
     try {
       primitive::create_symlink(primitive::read_symlink(old_link), new_link);

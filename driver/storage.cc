@@ -9,7 +9,8 @@
 
 namespace {
 
-// Owns what open(2) returned and closes it at the end of its scope; -1, a failed open, owns nothing.
+// Owns what open(2) returned and closes it at the end of its scope; -1, a failed open, owns
+// nothing.
 class olm_descriptor {
  public:
   explicit olm_descriptor(int opened) noexcept : number(opened) {}

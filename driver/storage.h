@@ -1,6 +1,7 @@
 #pragma once
 
 // Puts the program's own directory and that of the downloads into data protection class D, so that
-// they can be used before the device is first unlocked. A directory that can't be opened is skipped.
+// they can be used before the device is first unlocked. Directories that can't be opened are
+// skipped.
 // Prints nothing and throws nothing.
 void prepare_storage() noexcept;

@@ -69,7 +69,7 @@ std::string difference(tree before, tree after) {
   for (const auto& [path, what] : before) after.try_emplace(path, "(absent)");
   std::string lines;
   for (const auto& [path, what] : after) {
-    if (what != before[path]) lines += path + " " + what + "\n";
+    if (what != before[path]) lines.append(path + " ").append(what + "\n");
   }
   return lines;
 }

@@ -72,7 +72,7 @@ struct boot_case {
   fault planned = {};
   void (*before)() = nothing;
 };
-void PrintTo(const boot_case& row, std::ostream* stream) { *stream << row.name; }
+std::ostream& operator<<(std::ostream& stream, const boot_case& row) { return stream << row.name; }
 
 const boot_case cases[] = {
     {"nothing_new", "", "", ""},

@@ -9,17 +9,17 @@
 // for one by name; the others give wrong matches.
 struct olm_pattern_traits : std::regex_traits<char> {
   template <typename iterator>
-  char_class_type lookup_classname(iterator /*first*/, iterator /*last*/,
-                                   bool /*ignore_case*/ = false) const {
+  static char_class_type lookup_classname(iterator /*first*/, iterator /*last*/,
+                                          bool /*ignore_case*/ = false) {
     return {};
   }
   template <typename iterator>
-  string_type lookup_collatename(iterator /*first*/, iterator /*last*/) const {
+  static string_type lookup_collatename(iterator /*first*/, iterator /*last*/) {
     return {};
   }
-  bool isctype(char /*character*/, char_class_type /*mask*/) const { return false; }
+  static bool isctype(char /*character*/, char_class_type /*mask*/) { return false; }
   template <typename iterator>
-  string_type transform_primary(iterator /*first*/, iterator /*last*/) const {
+  static string_type transform_primary(iterator /*first*/, iterator /*last*/) {
     return {};
   }
 };

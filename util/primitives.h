@@ -24,8 +24,8 @@ namespace primitive {
 // Prints "remove: could not remove PATH" and throws.
 void remove(const std::string& path);
 
-// Returns whether `path` leads to something. Links are followed: a dangling one doesn't exist. Every
-// failure counts as false. Prints nothing and throws nothing.
+// Returns whether `path` leads to something. Links are followed: a dangling one doesn't exist.
+// Every failure counts as false. Prints nothing and throws nothing.
 bool exists(const std::string& path) noexcept;
 
 // Returns the text of the link at `path`, cut to its first 1024 bytes; the empty string when

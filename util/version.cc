@@ -45,6 +45,10 @@ void olm_version::parse(const std::string& text) {
   }
 }
 
-bool operator>(const olm_version& a, const olm_version& b) { return ordering_key(a) > ordering_key(b); }
+bool operator>(const olm_version& a, const olm_version& b) {
+  return ordering_key(a) > ordering_key(b);
+}
 
-bool operator==(const olm_version& a, const olm_version& b) { return ordering_key(a) == ordering_key(b); }
+bool operator==(const olm_version& a, const olm_version& b) {
+  return ordering_key(a) == ordering_key(b);
+}
