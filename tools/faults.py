@@ -200,7 +200,7 @@ def record_not_written(outcome, path, was, found):
             and (outcome.killed or outcome.names(RECORD) or outcome.call.writes_record))
 
 
-def no_icu_link(outcome, path, was, found):
+def icu_link_missing(outcome, path, was, found):
     return (path == ICUTZ and found == was == ABSENT and outcome.killed
             and outcome.left.get(ZONEINFO) == link(DOWNLOAD + "/zoneinfo"))
 
@@ -223,7 +223,7 @@ def zone_lost(outcome, path, _, found):
                  else outcome.names(LOCALTIME) or ZONEINFO + "/" in outcome.call.line))
 
 
-RULES = (record_not_written, no_icu_link, old_icu_link_lost, icu_link_left_over, zone_lost)
+RULES = (record_not_written, icu_link_missing, old_icu_link_lost, icu_link_left_over, zone_lost)
 
 
 def ended_early(outcome):
