@@ -63,6 +63,7 @@ static void read_download(void) {
 int main(int argc, char** argv) {
   int update = argc > 1 && strcmp(argv[1], "update") == 0;
   signal(SIGPIPE, SIG_IGN);
+  signal(SIGXFSZ, SIG_IGN);
   put_into_class_d(STORAGE);
   put_into_class_d(STORAGE "tz/");
   access("/var/db/icutz", F_OK);

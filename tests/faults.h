@@ -1,6 +1,5 @@
 #pragma once
 
-#include <err.h>
 #include <fts.h>
 #include <unistd.h>
 
@@ -27,13 +26,6 @@ inline bool fails(const char* name, const std::vector<int>& arguments = {}) {
   return true;
 }
 
-// Calls warn(3), after which the error number is another, as it may be.
-template <typename warning>
-void warn_and_forget(const warning& call) {
-  call();
-  errno = EDOM;
-}
-
 // For the files of the program that are compiled with this header ahead of them.
 #ifdef OLMBOOT_FAULTS
 #define access(path, mode) (fails("access", {mode}) ? -1 : access(path, mode))
@@ -41,7 +33,6 @@ void warn_and_forget(const warning& call) {
 #define readlink(...) (fails("readlink") ? -1 : readlink(__VA_ARGS__))
 #define symlink(...) (fails("symlink") ? -1 : symlink(__VA_ARGS__))
 #define unlink(...) (fails("unlink") ? -1 : unlink(__VA_ARGS__))
-#define warn(...) warn_and_forget([&] { warn(__VA_ARGS__); })
 #include <fcntl.h>
 #define fcntl(...) fails("fcntl", {__VA_ARGS__})
 #endif
