@@ -25,7 +25,7 @@ directory_walk open_walk(std::string directory) {
   directory_walk walk(fts_open(roots, FTS_COMFOLLOW | FTS_PHYSICAL | FTS_XDEV, nullptr));
   if (walk) return walk;
   const filesystem_error error = errno;
-  // This class had the name in the message before; whoever searches for the message knows that one.
+  // tz_icu, not olm_icu: the message is fixed, and searched for as it stands.
   warn("tz_icu::initialize: fts_open of %s failed, %s", directory.c_str(), std::strerror(error));
   throw_filesystem_error(error);
 }
