@@ -29,8 +29,6 @@ class device : public ::testing::Test {
 
   device() : root(fs::canonical(fs::temp_directory_path()) / "olmboot_tests.XXXXXX") {
     if (mkdtemp(root.data()) == nullptr) throw std::runtime_error("can't make " + root);
-    planned_fault = {};
-    put("/usr/share (directory)\n~/tz (directory)\n");
   }
   ~device() override { fs::remove_all(root); }
 
@@ -65,12 +63,12 @@ class device : public ::testing::Test {
     tree found;
     for (const auto& entry : fs::recursive_directory_iterator(root)) {
       std::string& what = found[shortened(entry.path().string().substr(root.size()))];
-      what = entry.is_directory() ? "(directory)" : "(pipe)";
-      if (entry.is_symlink()) {
-        what = "-> " + shortened(fs::read_symlink(entry));
-      } else if (entry.is_regular_file()) {
-        what = "= " + (std::ostringstream() << std::ifstream(entry.path()).rdbuf()).str();
-      }
+      const fs::file_type type = entry.symlink_status().type();
+      if (type == fs::file_type::directory) what = "(directory)";
+      if (type == fs::file_type::fifo) what = "(pipe)";
+      if (type == fs::file_type::symlink) what = "-> " + shortened(fs::read_symlink(entry));
+      if (type != fs::file_type::regular) continue;
+      what = "= " + (std::ostringstream() << std::ifstream(entry.path()).rdbuf()).str();
     }
     return found;
   }
