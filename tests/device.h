@@ -63,11 +63,10 @@ class device : public ::testing::Test {
     tree found;
     for (const auto& entry : fs::recursive_directory_iterator(root)) {
       std::string& what = found[shortened(entry.path().string().substr(root.size()))];
-      const fs::file_type type = entry.symlink_status().type();
-      if (type == fs::file_type::directory) what = "(directory)";
-      if (type == fs::file_type::fifo) what = "(pipe)";
-      if (type == fs::file_type::symlink) what = "-> " + shortened(fs::read_symlink(entry));
-      if (type != fs::file_type::regular) continue;
+      if (entry.is_symlink()) what = "-> " + shortened(fs::read_symlink(entry));
+      if (!what.empty()) continue;
+      what = entry.is_directory() ? "(directory)" : "(pipe)";
+      if (!entry.is_regular_file()) continue;
       what = "= " + (std::ostringstream() << std::ifstream(entry.path()).rdbuf()).str();
     }
     return found;
