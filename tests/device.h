@@ -9,24 +9,22 @@
 #include <cstring>
 #include <filesystem>
 #include <fstream>
-#include <functional>
 #include <map>
 #include <regex>
 #include <sstream>
 
 #include "faults.h"
 
+int olmboot_main();
+
 namespace fs = std::filesystem;
 
 // A throw-away device in a temporary directory. The test process only changes it from outside. A
-// forked child enters it and sees nothing else.
-//
-// In all texts "~/" is short for the program's own directory. A line tells what stands at a path:
+// forked child enters it and sees nothing else. In all texts "~/" is short for the program's own
+// directory. A line tells what stands at a path:
 //   "PATH -> TARGET"   "PATH = TEXT"   "PATH (directory)"   "PATH (pipe)"   "PATH (absent)"
 class device : public ::testing::Test {
  protected:
-  using tree = std::map<std::string, std::string>;  // what stands at each path
-
   device() : root(fs::canonical(fs::temp_directory_path()) / "olmboot_tests.XXXXXX") {
     if (mkdtemp(root.data()) == nullptr) throw std::runtime_error("can't make " + root);
   }
@@ -58,57 +56,29 @@ class device : public ::testing::Test {
     }
   }
 
-  // Returns what stands on the device.
-  tree look() const {
-    tree found;
-    for (const auto& entry : fs::recursive_directory_iterator(root)) {
-      std::string& what = found[shortened(entry.path().string().substr(root.size()))];
-      if (entry.is_symlink()) what = "-> " + shortened(fs::read_symlink(entry));
-      if (!what.empty()) continue;
-      what = entry.is_directory() ? "(directory)" : "(pipe)";
-      if (!entry.is_regular_file()) continue;
-      what = "= " + (std::ostringstream() << std::ifstream(entry.path()).rdbuf()).str();
-    }
-    return found;
-  }
-
-  // Returns lines that tell what has changed on the device, in the order of the paths.
-  std::string changes_since(tree before) const {
-    tree now = look();
-    for (const auto& [path, what] : before) now.try_emplace(path, "(absent)");
-    std::string lines;
-    for (const auto& [path, what] : now) {
-      if (before[path] != what) lines.append(path + " ").append(what + "\n");
-    }
-    return lines;
-  }
-
-  // Calls `body` in a child. Returns the lines that were printed, then what `body` returned, then
-  // how the child ended, if not well. A warning is shown without the program's name; the error text
-  // behind it is "(NAME)", or left out if `expected` leaves it out.
-  std::string run(const std::function<std::string()>& body,
-                  const std::string& expected = {}) const {
+  // Calls `body` in a child that sees the device alone, with `planned` as its fault. Returns the
+  // lines that were printed, then how the child ended, if not with status 0, then what has changed
+  // on the device, in the order of the paths. A line that no warning printed is marked.
+  std::string run(int body(), const fault& planned = {}) const {
+    auto before = look();
     ::testing::internal::CaptureStdout();
     ::testing::internal::CaptureStderr();
     const pid_t child = fork();
-    if (child == 0) {
-      alarm(120);
-      const int machine = open("/", O_RDONLY);
-      enter();
-      const int next = dup(machine);
-      std::fputs(body().c_str(), stdout);
-      if (dup(machine) > next + 1) std::puts("a descriptor is left open");
-      // A leak check at the exit needs the machine's /proc.
-      std::exit(fchdir(machine) + chroot("."));
-    }
+    if (child == 0) enter(body, planned);
     int status = 0;
     waitpid(child, &status, 0);
-    std::string seen;
-    std::istringstream errors(shortened(::testing::internal::GetCapturedStderr()));
-    for (std::string line; std::getline(errors, line);) seen += shown(line, expected) + "\n";
+    std::string seen = ::testing::internal::GetCapturedStderr();
+    seen = std::regex_replace(seen, std::regex("([^\r])\n"), "$1 (no warning)\n");
+    seen = shortened(std::regex_replace(seen, std::regex("\r"), ""));
     seen += ::testing::internal::GetCapturedStdout();
-    if (WIFSIGNALED(status)) return seen + strsignal(WTERMSIG(status));
-    return WEXITSTATUS(status) == 0 ? seen : seen + "status 1\n";
+    if (WIFSIGNALED(status)) seen.append(strsignal(WTERMSIG(status))).append("\n");
+    if (WEXITSTATUS(status) != 0) seen += "status " + std::to_string(WEXITSTATUS(status)) + "\n";
+    auto now = look();
+    for (const auto& [path, what] : before) now.try_emplace(path, "(absent)");
+    for (const auto& [path, what] : now) {
+      if (before[path] != what) seen.append(path + " ").append(what + "\n");
+    }
+    return seen;
   }
 
  private:
@@ -116,25 +86,36 @@ class device : public ::testing::Test {
     return std::regex_replace(text, std::regex("/var/db/timezone/"), "~/");
   }
 
-  // Makes this process see the device alone; in a user namespace if it isn't root.
-  void enter() const {
-    if (geteuid() != 0) unshare(CLONE_NEWUSER);
-    if (chroot(root.c_str()) == 0 && chdir("/") == 0) return;
-    std::fputs("no right to chroot: be root, or allow user namespaces\n", stderr);
-    std::exit(EXIT_FAILURE);
+  // Returns what stands at each path of the device.
+  std::map<std::string, std::string> look() const {
+    std::map<std::string, std::string> found;
+    for (const auto& entry : fs::recursive_directory_iterator(root)) {
+      std::string& what = found[shortened(entry.path().string().substr(root.size()))];
+      what = entry.is_directory() ? "(directory)" : "(pipe)";
+      if (entry.is_symlink()) {
+        what = "-> " + shortened(fs::read_symlink(entry));
+      } else if (entry.is_regular_file()) {
+        what = "= " + (std::ostringstream() << std::ifstream(entry.path()).rdbuf()).str();
+      }
+    }
+    return found;
   }
 
-  // Returns a line of standard error as run() shows it.
-  static std::string shown(const std::string& line, const std::string& expected) {
-    const std::string name = std::string(program_invocation_short_name) + ": ";
-    const std::size_t end = std::max(line.rfind(": "), name.size());
-    for (int number = 0; number < 134; ++number) {
-      std::string message = line.substr(std::min(name.size(), line.size()), end - name.size());
-      if (line != name + message + ": " + std::strerror(number)) continue;
-      if (("\n" + expected).find("\n" + message + "\n") != std::string::npos) return message;
-      return message + " (" + strerrorname_np(number) + ")";
+  // Makes the device this process's root, in a user namespace if it isn't run by root. Ends with
+  // what `body` returns. Like main, lets nothing that `body` throws pass.
+  [[noreturn]] void enter(int body(), const fault& planned) const noexcept {
+    const int machine = open("/", O_RDONLY);
+    if (geteuid() != 0) unshare(CLONE_NEWUSER);
+    if (chroot(root.c_str()) != 0 || chdir("/") != 0) {
+      std::fputs("no right to chroot: be root, or allow user namespaces\n", stderr);
+      std::exit(EXIT_FAILURE);
     }
-    return "not a warning: " + line;
+    const int next = dup(machine);
+    planned_fault = planned;
+    const int status = body();
+    if (dup(machine) > next + 1) std::puts("a descriptor is left open");
+    // A leak check at the exit needs the machine's /proc.
+    std::exit(fchdir(machine) + chroot(".") + status);
   }
 
   std::string root;

@@ -29,7 +29,7 @@ inline bool fails(const char* name, const std::vector<int>& arguments = {}) {
 // For the files of the program that are compiled with this header ahead of them.
 #ifdef OLMBOOT_FAULTS
 #define access(path, mode) (fails("access", {mode}) ? -1 : access(path, mode))
-#define fts_open(path, flags, by) (fails("fts_open", {flags}) ? nullptr : fts_open(path, flags, by))
+#define fts_open(at, how, by) (fails("fts_open", {how, bool(by)}) ? nullptr : fts_open(at, how, by))
 #define readlink(...) (fails("readlink") ? -1 : readlink(__VA_ARGS__))
 #define symlink(...) (fails("symlink") ? -1 : symlink(__VA_ARGS__))
 #define unlink(...) (fails("unlink") ? -1 : unlink(__VA_ARGS__))

@@ -1,6 +1,8 @@
 #include <sys/syscall.h>
 #include <sys/xattr.h>
 
+#include <csignal>
+#include <cstdarg>
 #include <stdexcept>
 
 #include "dataset/dataset.h"
@@ -8,7 +10,6 @@
 #include "dataset/zoneinfo.h"
 #include "device.h"
 #include "driver/link_state.h"
-#include "driver/storage.h"
 #include "util/pattern.h"
 #include "util/primitives.h"
 #include "util/regular_file.h"
@@ -16,9 +17,24 @@
 
 void set_class_d_by_fcntl(int descriptor) noexcept;
 
-// The read that libstdc++'s file streams call.
+// The read(2) that libstdc++'s file streams call.
 extern "C" ssize_t read(int descriptor, void* buffer, std::size_t size) {
   return fails("read") ? -1 : syscall(SYS_read, descriptor, buffer, size);
+}
+
+// The warn(3) of the whole program. It prints the message alone, and a \r by which its lines can be
+// told. A planned failure is that of a pipe without a reader, and of a full disk.
+extern "C" void warn(const char* format, ...) {
+  va_list arguments;
+  va_start(arguments, format);
+  std::vfprintf(stderr, format, arguments);
+  va_end(arguments);
+  std::fputs("\r\n", stderr);
+  if (fails("warn")) {
+    std::raise(SIGPIPE);
+    std::raise(SIGXFSZ);
+  }
+  errno = 0;  // no caller may rely on it
 }
 
 namespace {
@@ -28,16 +44,13 @@ using parts_test = device;
 const std::string downloads = "/var/db/timezone/tz/";
 
 TEST_F(parts_test, versions_are_strictly_ordered) {
-  std::vector<olm_version> ascending(1);
-  for (const auto* text :
-       {"0a", "2016a", "2016a.0", "2016a.0.5", "2016a.1", "2016a.1.0", "2016a.1.1", "2016a.9.9",
-        "2016a.10.02", "2016az", "2016b", "2016z", "2016za.2", "2019a", "2147483647a"}) {
-    ascending.emplace_back(text);
-  }
+  const std::string ascending[] = {"0a",      "2016a",     "2016a.0",   "2016a.0.5",
+                                   "2016a.1", "2016a.1.0", "2016a.9.9", "2016a.10.02",
+                                   "2016az",  "2016b",     "2019a",     "2147483647a"};
   for (const auto& a : ascending) {
     for (const auto& b : ascending) {
-      EXPECT_EQ(a > b, &a > &b) << a.letters << a.major << a.minor << b.letters;
-      EXPECT_EQ(a == b, &a == &b) << a.letters << a.major << a.minor << b.letters;
+      EXPECT_EQ(olm_version(a) > olm_version(b), &a > &b) << a << " and " << b;
+      EXPECT_EQ(olm_version(a) == olm_version(b), &a == &b) << a << " and " << b;
     }
   }
   EXPECT_EQ(olm_version("02016a.010"), olm_version("2016a.10"));
@@ -64,8 +77,6 @@ TEST_F(parts_test, an_error_is_thrown_and_stays_the_error_number) {
     const olm_icu walked("/none");
     primitive::create_symlink("/none", "");
   };
-  const int standard_error = dup(STDERR_FILENO);
-  close(STDERR_FILENO);  // so that warn(3) fails and leaves another number
   for (const int error : {EROFS, EACCES, ELOOP, ENOTDIR}) {
     for (const auto* call : {"unlink", "readlink", "fts_open", "symlink"}) {
       planned_fault = {call, 1, error};
@@ -73,7 +84,6 @@ TEST_F(parts_test, an_error_is_thrown_and_stays_the_error_number) {
       EXPECT_STREQ(strerrorname_np(errno), strerrorname_np(error)) << call;
     }
   }
-  dup2(standard_error, STDERR_FILENO);
 }
 
 TEST_F(parts_test, links) {
@@ -81,13 +91,10 @@ TEST_F(parts_test, links) {
   EXPECT_EQ(primitive::read_symlink(outside("/link")), std::string(1024, 'x'));
   primitive::exists("/");
   EXPECT_EQ(recorded_arguments, std::vector<int>{F_OK});
-  for (const std::string path : {"2024a.1.0", "x", "a/b"}) {
-    EXPECT_EQ(parse_zoneinfo_link(downloads + path + "/zoneinfo"), downloads + path);
-    EXPECT_EQ(parse_zoneinfo_link(downloads + path + "/"), downloads + path);
-  }
-  for (const std::string& link :
-       {downloads + "2024a.1.0", downloads + "/zoneinfo", downloads, std::string("zoneinfo"),
-        std::string("/usr/share/zoneinfo.default/"), std::string("/usr/share/zoneinfo")}) {
+  EXPECT_EQ(parse_zoneinfo_link(downloads + "x/zoneinfo"), downloads + "x");
+  EXPECT_EQ(parse_zoneinfo_link(downloads + "a/b/"), downloads + "a/b");
+  for (const auto* link : {"/usr", "/var/db/timezone/tz/x", "/var/db/timezone/tz//",
+                           "/mnt/var/db/timezone/tz/x/", "/usr/share/zoneinfo.default/"}) {
     EXPECT_THROW(parse_zoneinfo_link(link), filesystem_error) << link;
   }
 }
@@ -108,14 +115,13 @@ TEST_F(parts_test, only_a_word_that_ends_is_read) {
 }
 
 TEST_F(parts_test, a_pattern_with_a_class_is_refused) {
-  for (const auto* pattern : {"[[:alpha:]]", "[[=a=]]", "[[.a.]]"}) {
-    EXPECT_THROW(compile_pattern(pattern), std::regex_error) << pattern;
-  }
+  EXPECT_THROW(compile_pattern("[[:alpha:]]"), std::regex_error);
+  EXPECT_THROW(compile_pattern("[[=a=]]"), std::regex_error);
 }
 
 TEST_F(parts_test, the_first_public_file_of_the_right_name_names_the_schema) {
   const auto has_schema_of = [this](const std::string& other) {
-    return olm_icu(outside("/data")).compatible_schema(olm_icu(outside(other)));
+    return olm_icu(outside(other)).compatible_schema(olm_icu(outside("/data")));
   };
   for (const std::string entry :
        {"icutz90B.dat = ", "icutz90x.dat = ", "icutzb.dat = ", "icutz90be.dat = ",
@@ -125,60 +131,52 @@ TEST_F(parts_test, the_first_public_file_of_the_right_name_names_the_schema) {
     EXPECT_TRUE(has_schema_of("/no_data")) << entry;
     put("/data/icutz (absent)\n");
   }
-  put("/data/icutz -> ../other/icutz\n/other/icutz/icutz90e.dat = data\n");
+  put("/data/icutz -> ../other/icutz\n/other/icutz/icutz109e.dat = data\n");
   EXPECT_FALSE(has_schema_of("/no_data"));
-  EXPECT_EQ(recorded_arguments, (std::vector<int>{FTS_COMFOLLOW | FTS_PHYSICAL | FTS_XDEV}));
-  chmod(outside("/other/icutz/icutz90e.dat").c_str(), 0640);
-  EXPECT_TRUE(has_schema_of("/no_data"));
-  for (int i = 0; i < 40; ++i) {
-    put("/other/icutz/icutz" + std::to_string(10 + (i + 20) % 40) + "b.dat = data\n");
-  }
-  fs::remove(outside("/other/icutz/icutz90e.dat"));
-  const fs::path first = fs::directory_iterator(outside("/other/icutz"))->path().filename();
-  put("/first/icutz/" + first.string() + " = data\n");
-  EXPECT_FALSE(has_schema_of("/no_data"));
+  EXPECT_EQ(recorded_arguments, (std::vector<int>{FTS_COMFOLLOW | FTS_PHYSICAL | FTS_XDEV, false}));
+  put("/other/icutz/icutz11b.dat = data\n");
+  const fs::path first = fs::directory_iterator(outside("/other/icutz"))->path();
+  put("/first/icutz/" + first.filename().string() + " = data\n");
   EXPECT_TRUE(has_schema_of("/first"));
+  chmod(first.c_str(), 0640);
+  EXPECT_FALSE(has_schema_of("/first"));
 }
 
 TEST_F(parts_test, no_path_means_the_system_data_set) {
   put("/usr/share/icu/icutzformat.txt = 44l\n/usr/share/zoneinfo.default/+VERSION = 2016b\n");
   put("~/tz/2016b.1.0/icutz/icutz44l.dat = data\n");
-  const auto ask = []() -> std::string {
-    const std::string download = downloads + "2016b.1.0";
-    if (olm_icu().compatible_schema(olm_zoneinfo())) return "wrong kind";
-    if (!olm_icu().compatible_schema(olm_icu(download))) return "wrong ICU directory";
-    if (olm_dataset() == olm_dataset(download)) return "one path, two data sets";
-    return olm_dataset() == olm_dataset("") ? olm_zoneinfo().get_file_version() : "two systems";
-  };
-  const std::string line = "olm_icu::compatible_schema: could not dynamic_cast other component\n";
-  EXPECT_EQ(run(ask, line), line + "2016b");
+  const std::string seen = run([] {
+    EXPECT_FALSE(olm_icu().compatible_schema(olm_zoneinfo()));
+    EXPECT_TRUE(olm_icu().compatible_schema(olm_icu(downloads + "2016b.1.0")));
+    EXPECT_FALSE(olm_dataset() == olm_dataset(downloads + "2016b.1.0"));
+    EXPECT_TRUE(olm_dataset() == olm_dataset(""));
+    EXPECT_EQ(olm_zoneinfo().get_file_version(), "2016b");
+    return 0;
+  });
+  EXPECT_EQ(seen, "olm_icu::compatible_schema: could not dynamic_cast other component\n");
+  EXPECT_EQ(olm_dataset(downloads + "a/b").version_string(), "a/b");
   EXPECT_THROW(olm_dataset{downloads}, std::invalid_argument);
-  EXPECT_THROW(olm_dataset{downloads.substr(1)}, std::invalid_argument);
+  EXPECT_THROW(olm_dataset{"/" + downloads + "2016b"}, std::invalid_argument);
 }
 
-TEST_F(parts_test, the_directories_have_the_class_attribute) {
+TEST_F(parts_test, the_directories_have_class_d) {
+  set_class_d_by_fcntl(7);
+  EXPECT_EQ(recorded_arguments, (std::vector<int>{7, 64, 4}));
 #ifdef OLMBOOT_DATA_PROTECTION
   GTEST_SKIP() << "the kernel keeps the class";
 #endif
-  const auto prepare = [] {
-    close(STDIN_FILENO);  // so that a directory is opened as descriptor 0
-    prepare_storage();
-    return std::string();
-  };
   put("~/tz (directory)\n");
+  setxattr(outside("~/").c_str(), "user.protection_class", "B", 1, 0);
+  run([] {
+    close(STDIN_FILENO);  // so that a directory is opened as descriptor 0
+    return olmboot_main();
+  });
   for (const auto* path : {"~/", "~/tz"}) {
-    char value[] = "??";
-    const int given = setxattr(outside(path).c_str(), "user.protection_class", value, 1, 0);
-    EXPECT_EQ(run(prepare), "");
-    getxattr(outside(path).c_str(), "user.protection_class", value, 2);
-    if (given != 0) GTEST_SKIP() << "the temporary directory's file system has no attributes";
-    EXPECT_STREQ(value, "4?") << path;
+    char value[2] = "";
+    const ssize_t size = getxattr(outside(path).c_str(), "user.protection_class", value, 2);
+    if (size < 0 && errno == ENOTSUP) GTEST_SKIP() << "the file system keeps no attributes";
+    EXPECT_EQ(std::string(value, size == 1), "4") << path;
   }
-}
-
-TEST_F(parts_test, the_kernel_is_asked_for_class_d) {
-  set_class_d_by_fcntl(7);
-  EXPECT_EQ(recorded_arguments, (std::vector<int>{7, 64, 4}));
 }
 
 }  // namespace
