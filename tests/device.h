@@ -57,8 +57,8 @@ class device : public ::testing::Test {
   }
 
   // Calls `body` in a child that sees the device alone, with `planned` as its fault. Returns the
-  // lines that were printed, then how the child ended, if not with status 0, then what has changed
-  // on the device, in the order of the paths. A line that no warning printed is marked.
+  // lines that were printed, how the child ended if not with status 0, and what has changed, in the
+  // order of the paths. A line that warn, in parts_test.cc, didn't print is marked.
   std::string run(int body(), const fault& planned = {}) const {
     auto before = look();
     ::testing::internal::CaptureStdout();
@@ -68,7 +68,7 @@ class device : public ::testing::Test {
     int status = 0;
     waitpid(child, &status, 0);
     std::string seen = ::testing::internal::GetCapturedStderr();
-    seen = std::regex_replace(seen, std::regex("([^\r])\n"), "$1 (no warning)\n");
+    seen = std::regex_replace(seen, std::regex("([^\r])\n"), "$1 (not a warning)\n");
     seen = shortened(std::regex_replace(seen, std::regex("\r"), ""));
     seen += ::testing::internal::GetCapturedStdout();
     if (WIFSIGNALED(status)) seen.append(strsignal(WTERMSIG(status))).append("\n");

@@ -116,7 +116,7 @@ const boot_case cases[] = {
     {"no_memory_to_read_the_zoneinfo_link", "", invalid, "", fault{"readlink", 2, 0}},
     {"no_memory_for_a_warning", "~/localtime -> /usr/share/zoneinfo/None\n",
      correcting + "/None\n" + zone_reset + "status 1\n", "", fault{"warn", 2, 0}},
-    {"no_reader_and_no_space", "~/localtime -> ..~/zoneinfo\n", zone_reset, default_zone,
+    {"no_reader_and_a_size_limit", "~/localtime -> ..~/zoneinfo\n", zone_reset, default_zone,
      fault{"warn", 1, EPIPE}},
 };
 

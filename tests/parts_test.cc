@@ -22,8 +22,8 @@ extern "C" ssize_t read(int descriptor, void* buffer, std::size_t size) {
   return fails("read") ? -1 : syscall(SYS_read, descriptor, buffer, size);
 }
 
-// The warn(3) of the whole program. It prints the message alone, and a \r by which its lines can be
-// told. A planned failure is that of a pipe without a reader, and of a full disk.
+// The warn(3) of the whole program. It prints the message alone, and a \r that marks its lines. A
+// planned fault raises what a pipe without a reader and a limit on file sizes raise.
 extern "C" void warn(const char* format, ...) {
   va_list arguments;
   va_start(arguments, format);
@@ -34,7 +34,7 @@ extern "C" void warn(const char* format, ...) {
     std::raise(SIGPIPE);
     std::raise(SIGXFSZ);
   }
-  errno = 0;  // no caller may rely on it
+  errno = 0;  // as the C library's may change it
 }
 
 namespace {
