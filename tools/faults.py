@@ -30,6 +30,10 @@ POSSIBLE = {"brk": ("ENOMEM",), "mmap": ("ENOMEM",), "munmap": ("ENOMEM",), "rt_
             "futex": (), "exit_group": ()}
 TIME_LIMIT = 20  # seconds
 
+# A whole line of warn(3).
+WARNING = re.compile("olmboot: .+: (%s)" % "|".join(
+    re.escape(text) for text in {os.strerror(number) for number in range(134)}))
+
 
 def link(target):
     return "-> " + target
@@ -102,12 +106,14 @@ class Device:
         return found
 
     def boot(self, *injection):
-        """Runs the program. Returns its status, a signal's negated, and its lines."""
+        """Runs the program. Returns its status, a signal's negated, and the lines that it printed;
+        one on standard output says so."""
         command = ["setarch", "-R", "chroot", self.root, "/sbin/olmboot"]
         if injection:
             command = ["strace", "-o", self.trace, *injection, *command]
         run = subprocess.run(command, capture_output=True, check=False, timeout=TIME_LIMIT)
-        return run.returncode, run.stderr.decode().splitlines()
+        return run.returncode, run.stderr.decode().splitlines() + [
+            "on standard output: " + line for line in run.stdout.decode().splitlines()]
 
 
 def resolves(state, path):
@@ -128,6 +134,10 @@ class Call:
 
     def __init__(self, name, nth, line, old_end):
         self.name, self.nth, self.line, self.old_end = name, nth, line, old_end
+
+    @property
+    def writes_line(self):
+        return self.line.startswith("write(2,")
 
     @property
     def writes_record(self):
@@ -264,6 +274,9 @@ def check(device, history, outcome):
         elif not (resolves(left, ZONEINFO)
                   and left.get(LOCALTIME, "").startswith(link(ZONEINFO))):
             violations.append("links that can't be used")
+    if not outcome.killed and not outcome.call.writes_line:
+        violations += [f"this line is not a warning: {line}" for line in outcome.lines
+                       if not WARNING.fullmatch(line)]
     for path in sorted(left.keys() | history.before.keys()):
         if left.get(path) != history.before.get(path) and path not in OWN:
             violations.append(f"{path} has changed")
