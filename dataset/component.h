@@ -6,8 +6,8 @@
 // when its constructor returns and never changes. Destroying it changes nothing on disk.
 //
 // A component is made as its own type and handed at once to a std::shared_ptr of this one, which
-// remembers the type to destroy. The protected destructor allows nothing else: a component of this
-// type is neither deleted through a plain pointer nor held by value.
+// remembers the type to destroy. The protected destructor refuses what would destroy only this part
+// of it: a delete through a pointer to this type.
 class olm_dataset_component {
  public:
   // Returns whether this component's data is compatible with that of `other`, the component of
@@ -23,5 +23,5 @@ class olm_dataset_component {
   explicit olm_dataset_component(const std::string& path = {}) : dataset_path(path) {}
   ~olm_dataset_component() = default;
 
-  const std::string dataset_path;  // empty for the system data set
+  std::string dataset_path;  // empty for the system data set
 };

@@ -10,6 +10,13 @@
 #include "dataset/zoneinfo.h"
 #include "util/starts_with.h"
 
+namespace {
+
+// The end of the system data set's version string; before it stands the release of its tree.
+constexpr char system_version_suffix[] = ".1.0";
+
+}  // namespace
+
 olm_dataset::olm_dataset(const std::string& directory) : path(directory) { create_components(); }
 
 void olm_dataset::create_components() {

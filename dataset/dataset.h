@@ -14,14 +14,12 @@ class olm_dataset {
  public:
   // What the path of every download begins with; the rest of the path is its version string.
   static constexpr char downloads_root[] = "/var/db/timezone/tz/";
-  // The end of the system data set's version string; before it stands the release of its tree.
-  static constexpr char system_version_suffix[] = ".1.0";
 
-  // The download at `directory`; the system data set if that is empty.
-  // A version string outside the grammar gives the unknown version, after the two lines of
-  // olm_version::parse. Prints besides what the components print.
-  // For any other path, prints "olm_dataset::create_components: bad path DIRECTORY" and throws
-  // std::invalid_argument. Throws, too, what olm_version::parse and the components throw.
+  // The download at `directory`; the system data set if that is empty. A version string outside the
+  // grammar gives the unknown version.
+  // Prints and throws what olm_version::parse and the components do. For a directory that is not
+  // below downloads_root, prints "olm_dataset::create_components: bad path DIRECTORY" and throws
+  // std::invalid_argument.
   explicit olm_dataset(const std::string& directory = {});
 
   // Returns whether this data set's version is greater than that of `other`.

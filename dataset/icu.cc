@@ -11,9 +11,16 @@
 
 #include "util/pattern.h"
 #include "util/primitives.h"
-#include "util/regular_file.h"
+#include "util/first_word.h"
 
 namespace {
+
+// The system data set's directory. Never written, and no link leads to it.
+constexpr char system_directory[] = "/usr/share/icu";
+// The file in it whose first word is the system's schema.
+constexpr char schema_file[] = "icutzformat.txt";
+// The directory's name in a download's directory.
+constexpr char subdirectory[] = "icutz";
 
 struct walk_closer {
   void operator()(FTS* walk) const noexcept { fts_close(walk); }
@@ -36,8 +43,8 @@ const olm_pattern& data_file_pattern() {
   return pattern;
 }
 
-// The root is at level 0, what lies directly in it at level 1.
-bool is_public_file_in_root(const FTSENT& entry) {
+// Whether others may read it, and it lies directly in the directory walked, which is at level 0.
+bool is_public_file_at_top(const FTSENT& entry) {
   return entry.fts_errno == 0 && entry.fts_level == 1 && entry.fts_namelen != 0 &&
          entry.fts_info == FTS_F && (entry.fts_statp->st_mode & S_IROTH) != 0;
 }
@@ -63,7 +70,7 @@ std::string olm_icu::schema_of_data_file() const {
   const directory_walk walk = open_walk(directory);
   while (const FTSENT* const entry = fts_read(walk.get())) {
     std::cmatch results;
-    if (is_public_file_in_root(*entry) &&
+    if (is_public_file_at_top(*entry) &&
         std::regex_match(entry->fts_name, results, data_file_pattern())) {
       return results[1];
     }

@@ -9,22 +9,16 @@
 // compared as text.
 class olm_icu final : public olm_dataset_component {
  public:
-  // The system data set's directory. Never written, and no link leads to it.
-  static constexpr char system_directory[] = "/usr/share/icu";
-  // The file in it whose first word is the system's schema.
-  static constexpr char schema_file[] = "icutzformat.txt";
-  // The directory's name in a download's directory.
-  static constexpr char subdirectory[] = "icutz";
   // The link to the active download's directory; absent while the system data set is active.
   static constexpr char link_path[] = "/var/db/timezone/icutz";
   // Where that link was on older systems.
   static constexpr char legacy_link_path[] = "/var/db/icutz";
 
   // The files of the data set at `path`; the system data set's if that is empty. The schema stays
-  // empty when none is found. For a download that prints
-  //   "No ICU schema found for PATH"
-  // For a download, prints "tz_icu::initialize: fts_open of DIRECTORY failed, REASON" and throws
-  // filesystem_error when the walk of its directory can't be started.
+  // empty when none is found.
+  // If a download has no schema, prints "No ICU schema found for PATH". If the walk of its directory
+  // can't be started, prints "tz_icu::initialize: fts_open of DIRECTORY failed, REASON" and throws
+  // filesystem_error.
   explicit olm_icu(const std::string& path = {});
 
   // Returns whether `other` is an ICU component too and has the same schema.
@@ -44,5 +38,5 @@ class olm_icu final : public olm_dataset_component {
   std::string schema_of_data_file() const;
 
   std::string schema;
-  const std::string directory;
+  std::string directory;
 };

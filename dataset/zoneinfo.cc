@@ -3,7 +3,16 @@
 #include <err.h>
 
 #include "util/primitives.h"
-#include "util/regular_file.h"
+#include "util/first_word.h"
+
+namespace {
+
+// The tree's name in a download's directory.
+constexpr char subdirectory[] = "zoneinfo";
+// The file in a tree whose first word is the tree's release.
+constexpr char version_file[] = "+VERSION";
+
+}  // namespace
 
 olm_zoneinfo::olm_zoneinfo(const std::string& path)
     : olm_dataset_component(path),

@@ -9,10 +9,6 @@ class olm_zoneinfo final : public olm_dataset_component {
  public:
   // The system data set's tree. Never written.
   static constexpr char system_directory[] = "/usr/share/zoneinfo.default";
-  // The tree's name in a download's directory.
-  static constexpr char subdirectory[] = "zoneinfo";
-  // The file in a tree whose first word is the tree's release.
-  static constexpr char version_file[] = "+VERSION";
   // The link to the active tree.
   static constexpr char link_path[] = "/var/db/timezone/zoneinfo";
 
@@ -35,6 +31,6 @@ class olm_zoneinfo final : public olm_dataset_component {
  private:
   void initialize();
 
-  const std::string directory;
+  std::string directory;
   std::string file_version;
 };

@@ -15,7 +15,7 @@ void migrate_legacy_icu_link() {
     try {
       primitive::create_symlink(primitive::read_symlink(old_link), new_link);
     } catch (...) {
-      // Written out, to be found by what is printed.
+      // Spelled out, so that a search for the line finds it.
       warn("Could not migrate /var/db/icutz to /var/db/timezone/icutz");
     }
   }

@@ -10,8 +10,9 @@
 // Prints and throws what primitive::read_symlink does.
 std::string read_latest_path();
 
-// Returns the data set that `link`, the text of a zoneinfo link, names. Only the shape of the text
-// counts: the system's tree, or anything inside a directory below that of the downloads.
+// Returns the data set that `link`, the text of a zoneinfo link, names. Only the text counts: the
+// path of the system's tree names the system data set, and DOWNLOAD/NAME the download DOWNLOAD, if
+// that is below the directory of the downloads.
 // For any other text, prints "Bad zoneinfo link LINK" and throws no_error_number.
 std::string parse_zoneinfo_link(const std::string& link);
 

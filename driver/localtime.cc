@@ -15,7 +15,7 @@ namespace {
 
 constexpr char default_zone[] = "America/Los_Angeles";
 
-// Removes first, as everywhere: symlink(2) replaces nothing.
+// Removes what is there first: symlink(2) replaces nothing.
 void replace_link(const std::string& target) {
   (void)std::remove(paths::localtime_link);
   primitive::create_symlink(target, paths::localtime_link);

@@ -1,12 +1,15 @@
 #include "driver/selection.h"
 
 #include <err.h>
+#include <fcntl.h>
+#include <sys/stat.h>
+#include <unistd.h>
 
 #include <string>
 
 #include "dataset/dataset.h"
 #include "driver/link_state.h"
-#include "driver/record.h"
+#include "driver/paths.h"
 
 namespace {
 
@@ -21,6 +24,23 @@ std::string current_path_or_reset() {
     reset_to_system();
     return {};
   }
+}
+
+// Replaces the record of the last update by `from`, "_" and `to`, without a line end. What is not a
+// regular file stays as it is; of a link only open(2) can tell that, which is why this is no stream.
+// A failure isn't reported: the update is installed all the same.
+void write_record(const std::string& from, const std::string& to) {
+  const std::string text = from + "_" + to;
+  constexpr mode_t permissions = 0666;  // less the umask
+  // O_NONBLOCK: a named pipe without a reader is refused, not waited for.
+  constexpr int how = O_WRONLY | O_CREAT | O_NOFOLLOW | O_NONBLOCK | O_CLOEXEC;
+  const int file = open(paths::record, how, permissions);
+  if (file == -1) return;
+  struct stat status;
+  if (fstat(file, &status) == 0 && S_ISREG(status.st_mode) && ftruncate(file, 0) == 0) {
+    [[maybe_unused]] const ssize_t written = write(file, text.data(), text.size());
+  }
+  close(file);
 }
 
 void select_and_install_or_throw() {

@@ -7,7 +7,7 @@
 using filesystem_error = int;
 
 // Thrown for a condition that has no error number.
-constexpr filesystem_error no_error_number = -1;
+inline constexpr filesystem_error no_error_number = -1;
 
 // Throws `error`, and makes it the current error number again, which the line printed just before
 // may have changed. So the line that the catcher prints ends in the same cause.

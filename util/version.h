@@ -12,8 +12,8 @@ struct olm_version {
 
   std::int32_t year = absent;
   std::string letters;  // lower-case; empty when unknown
-  // Older C libraries have function-like macros of these two names: never write a parenthesis
-  // straight after one.
+  // Some C libraries' headers have function-like macros of these two names: never write a
+  // parenthesis straight after one.
   std::int32_t major = absent;
   std::int32_t minor = absent;
 

@@ -1,0 +1,13 @@
+#pragma once
+
+#include <string>
+
+// Returns the first word of the regular file at `path`, through links: white space is skipped, then
+// everything up to the next white space is taken, however long. Returns the empty string when there
+// is no word: the file is missing, blank or not a regular one, or a read fails. Only a regular file
+// is opened: a named pipe waits for its other end, and a device may have none.
+// With libc++ a read that fails within the word ends it there: its streams take that for the end of
+// the file.
+// Prints nothing. Throws std::bad_alloc, but only before it reads: the stream swallows a later one,
+// and the word counts as unreadable.
+std::string read_first_word(const std::string& path);
