@@ -2,7 +2,6 @@
 
 #include <err.h>
 #include <fcntl.h>
-#include <sys/stat.h>
 #include <unistd.h>
 
 #include <string>
@@ -26,18 +25,16 @@ std::string current_path_or_reset() {
   }
 }
 
-// Replaces the record of the last update by `from`, "_" and `to`, without a line end. What is not a
-// regular file stays as it is; of a link only open(2) can tell that, which is why this is no stream.
-// A failure isn't reported: the update is installed all the same.
+// Replaces the record of the last update by `from`, "_" and `to`, without a line end. Not by a
+// stream: that would follow a link. A failure isn't reported: the update is installed all the same.
 void write_record(const std::string& from, const std::string& to) {
   const std::string text = from + "_" + to;
   constexpr mode_t permissions = 0666;  // less the umask
-  // O_NONBLOCK: a named pipe without a reader is refused, not waited for.
+  // O_NONBLOCK keeps a named pipe from waiting for a reader; ftruncate(2) refuses it.
   constexpr int how = O_WRONLY | O_CREAT | O_NOFOLLOW | O_NONBLOCK | O_CLOEXEC;
   const int file = open(paths::record, how, permissions);
   if (file == -1) return;
-  struct stat status;
-  if (fstat(file, &status) == 0 && S_ISREG(status.st_mode) && ftruncate(file, 0) == 0) {
+  if (ftruncate(file, 0) == 0) {
     [[maybe_unused]] const ssize_t written = write(file, text.data(), text.size());
   }
   close(file);

@@ -80,10 +80,10 @@ const boot_case typical_cases[] = {
     {"nothing_new", on_2016c + newest_2016c + record + "2016b.1.0_2016c\n",
      refused("2016c", "2016c")},
     {"system_upgrade", version + "2017a\n" + on_2016c, incompatible(), on_system},
-    {"older_entries", old_zone + "/var/db/icu = file\n/var/db/icutz -> ../db\n",
+    {"older_entries", old_zone + "/var/db/icu = file\n/var/db/icutz -> ../db/icu\n",
      correcting("~/zoneinfo/Asia/Tokyo"),
      "/var/db/icu (absent)\n/var/db/icutz (absent)\n"
-     "~/icutz -> ../db\n~/localtime -> ~/zoneinfo/Asia/Tokyo\n"},
+     "~/icutz -> ../db/icu\n~/localtime -> ~/zoneinfo/Asia/Tokyo\n"},
 };
 
 const fault first_symlink = {"symlink", EROFS};
@@ -95,9 +95,9 @@ const boot_case rare_cases[] = {
      incompatible(), record + "2017a.1.0_2016c\n" + on_2016c},
     // The zone's link is replaced even if it works.
     {"no_format_file_and_relative_zone",
-     "/usr/share/icu/icutzformat.txt (absent)\n~/localtime -> ..~/zoneinfo\n" + on_2016a +
+     "/usr/share/icu/icutzformat.txt (absent)\n~/localtime -> ..~/zoneinfo\n" + on_2016e +
          newest_2016c,
-     incompatible() + refused("2016c", "2016a") + zone_reset(),
+     incompatible() + refused("2016c", "2016e") + zone_reset(),
      "~/icutz (absent)\n" + default_zone + "~/zoneinfo -> /usr/share/zoneinfo.default\n"},
     {"name_of_one_character_and_zone_elsewhere",
      "~/tz_latest -> ~/tz/x\n~/localtime -> /mnt/usr/share/zoneinfo/Asia/Tokyo\n",
@@ -112,8 +112,10 @@ const boot_case rare_cases[] = {
     {"no_version_file_and_dangling_old_ICU_link",
      "/usr/share/zoneinfo.default/+VERSION (absent)\n/var/db/icutz -> /none\n",
      unparsed(".1.0") + unparsed(".1.0")},
-    {"bad_zoneinfo_link_and_download", "~/zoneinfo -> /%s%n\n" + newest_2016c,
-     "Bad zoneinfo link /%s%n\n" + invalid(), record + "2016b.1.0_2016c\n" + on_2016c},
+    {"bad_zoneinfo_link_and_download",
+     "~/zoneinfo -> /%s%n\n/var/db/icutz -> /none\n" + newest_2016c,
+     "Bad zoneinfo link /%s%n\n" + invalid(),
+     "/var/db/icutz (absent)\n" + record + "2016b.1.0_2016c\n" + on_2016c},
     // A dangling ICU link goes, too.
     {"bad_version_and_bad_latest_link",
      version + "%s%n\n" + on_2016e + "~/icutz -> /none\n~/tz_latest -> ~/%s%n\n",
@@ -121,10 +123,14 @@ const boot_case rare_cases[] = {
          "olm_dataset::create_components: bad path ~/%s%n\n" + unable() + unparsed("%s%n.1.0"),
      on_system},
     // The zone is left alone.
-    {"number_too_large", version + "2147483648a\n" + old_zone, unable(), "", 1},
+    {"number_too_large", version + "2147483648a\n/var/db/icu = file\n" + old_zone, unable(),
+     "/var/db/icu (absent)\n", 1},
     {"long_word", version + long_word + "\n" + newest_2016c, refused("2016c", long_word + ".1.0")},
     {"long_latest_link", "~/tz_latest -> " + long_word.substr(0, 1100) + "\n",
      "olm_dataset::create_components: bad path " + long_word.substr(0, 1024) + "\n" + unable()},
+    // The latest link is read first.
+    {"directory_at_the_latest_link", "~/tz_latest (directory)\n~/zoneinfo -> /none\n",
+     unread("~/tz_latest") + unable(), "~/zoneinfo -> /usr/share/zoneinfo.default\n"},
     {"directory_at_the_zoneinfo_link", "~/zoneinfo (directory)\n~/icutz -> /none\n" + old_zone,
      unread("~/zoneinfo") + invalid() + zoneinfo_not_replaced() + unable() +
          zoneinfo_not_replaced(),
@@ -218,6 +224,7 @@ TEST_F(device, a_signal_for_what_cannot_be_written_ends_nothing) {
     return olmboot_main() + std::raise(SIGPIPE);
   });
   EXPECT_EQ(changes_since(before), full(record + "\n" + on_2016c));
+  EXPECT_EQ(fs::status(outside("~/TZVersionDiffRecord")).permissions(), fs::perms{0644});
 }
 
 }  // namespace
