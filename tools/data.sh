@@ -1,0 +1,40 @@
+# Real time zone data for the commands in this folder: this machine's own, and data compiled from it
+# with one rule changed. To be sourced after common.sh.
+# shellcheck shell=bash disable=SC2034,SC2154
+
+source_of_rules=/usr/share/zoneinfo/tzdata.zi
+# The rule by which most of North America turns its clocks forward, and a later date for it: as the tz
+# database has it, and as ICU does, whose months begin with 0.
+rule='^R u 2007 ma - Mar Su>=8 2 1 D$'
+changed_rule='R u 2007 ma - Mar Su>=22 2 1 D'
+icu_rule='US:intvector { 2, 8, '
+changed_icu_rule='US:intvector { 2, 22, '
+# A moment between the two dates.
+moment='2030-03-15 20:00 UTC'
+
+# Prints what icuinfo says of $1.
+icu_info() { icuinfo 2>/dev/null | sed -n "s/.*\"$1\">\(.*\)<.*/\1/p"; }
+
+# Compiles the changed tz database into the tree $1 and marks it as release $2.
+compile_tree() {
+  grep -q "$rule" "$source_of_rules" || fail "the rule to be changed is not in $source_of_rules"
+  mkdir -p "$1"
+  zic -d "$1" <(sed "s/$rule/$changed_rule/" "$source_of_rules")
+  echo "$2" >"$1/+VERSION"
+}
+
+# Compiles ICU's rules, changed in the same way, into the directory $1, as release $2. If there is $3,
+# packs them as the data file of that format, too.
+compile_icu() {
+  local text=$root/tmp/zoneinfo64.txt
+  mkdir -p "$1"
+  derb -c -s - zoneinfo64 | sed -e "s/$icu_rule/$changed_icu_rule/" \
+    -e 's/^zoneinfo64{/zoneinfo64:table(nofallback){/' \
+    -e "s/TZVersion { \".*\" }/TZVersion { \"$2\" }/" >"$text"
+  grep -q "$changed_icu_rule" "$text" || fail "the rule to be changed is not in ICU's data"
+  genrb -q -d "$1" "$text"
+  [ $# -lt 3 ] || {
+    echo zoneinfo64.res >"$root/tmp/list.txt"
+    icupkg -s "$1" -a "$root/tmp/list.txt" new "$1/icutz$3.dat"
+  }
+}
