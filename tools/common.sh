@@ -26,12 +26,13 @@ fail() {
 }
 
 # Installs those of the given Debian packages that are missing; says so, or what to do where it
-# can't.
+# can't. On another machine it says what is needed and goes on.
 need_packages() {
   local package missing=() as_root=()
-  for package in dpkg-query apt-get; do
-    command -v "$package" >/dev/null || fail "not a Debian machine; install by hand: $*"
-  done
+  if ! command -v dpkg-query >/dev/null || ! command -v apt-get >/dev/null; then
+    echo "Not a Debian machine. This needs what Debian has in these packages: $*"
+    return
+  fi
   for package in "$@"; do
     # A line for each architecture.
     dpkg-query -W -f '${db:Status-Status}\n' "$package" 2>/dev/null | grep -qx installed ||
@@ -84,7 +85,8 @@ build_preset() {
   exec 9>&-
 }
 
-# Makes an empty throw-away root and names it in $root. What works in it looks for the mark first.
+# Makes an empty throw-away root and names it in $root. It has a mark, which the benchmark looks for
+# before it removes anything.
 make_root() {
   root=$(mktemp -d)
   remove_at_end+=("$root")

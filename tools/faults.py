@@ -20,7 +20,7 @@ ZONEINFO, ICUTZ, LOCALTIME, LATEST, RECORD = (
 OLD_ICUTZ, OLD_ICU = "/var/db/icutz", "/var/db/icu"
 OWN = {ZONEINFO, ICUTZ, LOCALTIME, RECORD, OLD_ICUTZ, OLD_ICU}
 SYSTEM_TREE = "/usr/share/zoneinfo.default"
-DOWNLOAD = STORAGE + "tz/2016c.1.0"
+OLDER_DOWNLOAD, DOWNLOAD = STORAGE + "tz/2016b.2.0", STORAGE + "tz/2016c.1.0"
 DEFAULT_ZONE = ZONEINFO + "/America/Los_Angeles"
 ABSENT = "(absent)"
 
@@ -52,6 +52,8 @@ COMMON = {
     DOWNLOAD + "/zoneinfo/America/Los_Angeles": "zone",
     DOWNLOAD + "/zoneinfo/Europe/Paris": "zone",
     DOWNLOAD + "/icutz/icutz44l.dat": "data",
+    OLDER_DOWNLOAD + "/zoneinfo/Europe/Paris": "zone",
+    OLDER_DOWNLOAD + "/icutz/icutz44l.dat": "data",
     LATEST: link(DOWNLOAD),
     LOCALTIME: link(ZONEINFO + "/Europe/Paris"),
 }
@@ -60,6 +62,7 @@ BOOTS = {
     "new device": {path: what for path, what in COMMON.items()
                    if not path.startswith(STORAGE)} | {STORAGE + "tz/none": ""},
     "update": {**COMMON, ZONEINFO: link(SYSTEM_TREE)},
+    "newer download": {**COMMON, **active(OLDER_DOWNLOAD), RECORD: "2016b.1.0_2016b.2.0"},
     "nothing new": UPDATED,
     "system upgrade": {**UPDATED, SYSTEM_TREE + "/+VERSION": "2016d\n"},
     "older entries": {**UPDATED, ICUTZ: ABSENT, OLD_ICUTZ: link(DOWNLOAD + "/icutz"), OLD_ICU: "",
@@ -141,7 +144,7 @@ class Call:
 
     @property
     def writes_record(self):
-        return self.name == "write" and "_" in self.line
+        return self.name == "ftruncate" or self.name == "write" and "_" in self.line
 
     def errors(self):
         return POSSIBLE.get(self.name, ERRORS)
@@ -167,11 +170,14 @@ def calls_of(device, start):
             if line.startswith("+++"):
                 break
             seen[name] = seen.get(name, 0) + 1
+            # What prepare_process() calls first.
             started = started or line.startswith("rt_sigaction(SIGPIPE")
             if started:
                 calls.append(Call(name, seen[name], line.strip(), old_end))
             if name == "brk":
                 old_end = line.split("= ")[-1].strip()
+    if not calls:
+        sys.exit("faults: the trace doesn't show where the program starts")
     return calls
 
 
@@ -210,8 +216,12 @@ def record_not_written(outcome, path, was, found):
             and (outcome.killed or outcome.names(RECORD) or outcome.call.writes_record))
 
 
-def icu_link_missing(outcome, path, was, found):
-    return (path == ICUTZ and found == was == ABSENT and outcome.killed
+def record_names_system(_outcome, path, _was, found):
+    return path == RECORD and found == UPDATED[RECORD]
+
+
+def icu_link_not_new(outcome, path, was, found):
+    return (path == ICUTZ and found in (was, ABSENT) and outcome.killed
             and outcome.left.get(ZONEINFO) == link(DOWNLOAD + "/zoneinfo"))
 
 
@@ -233,7 +243,8 @@ def zone_lost(outcome, path, _, found):
                  else outcome.names(LOCALTIME) or ZONEINFO + "/" in outcome.call.line))
 
 
-RULES = (record_not_written, icu_link_missing, old_icu_link_lost, icu_link_left_over, zone_lost)
+RULES = (record_not_written, record_names_system, icu_link_not_new, old_icu_link_lost,
+         icu_link_left_over, zone_lost)
 
 
 def ended_early(outcome):
