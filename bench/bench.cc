@@ -4,11 +4,13 @@
 #include <fcntl.h>
 #include <spawn.h>
 #include <sys/ptrace.h>
+#include <sys/types.h>
 #include <sys/wait.h>
 #include <unistd.h>
 
 #include <algorithm>
 #include <chrono>
+#include <cstddef>
 #include <cstdio>
 #include <cstdlib>
 #include <filesystem>
@@ -17,6 +19,7 @@
 #include <limits>
 #include <sstream>
 #include <string>
+#include <utility>
 #include <vector>
 
 namespace fs = std::filesystem;
@@ -157,7 +160,7 @@ int main(int argc, char** argv) {
   null_device = open("/dev/null", O_RDWR);
   proc = open("/proc", O_RDONLY | O_DIRECTORY);
   benchmark::Initialize(&argc, argv);
-  benchmark::CPUInfo::Get();
+  benchmark::CPUInfo::Get();  // reads /sys, which the root doesn't have
   const char* const root = std::getenv("OLMBOOT_ROOT");
   if (root == nullptr || chdir(root) != 0 || chroot(".") != 0 || !fs::exists("/throw-away")) {
     (void)std::fputs("not in a throw-away root; use tools/bench\n", stderr);

@@ -9,9 +9,9 @@
 #include <memory>
 #include <regex>
 
+#include "util/first_word.h"
 #include "util/pattern.h"
 #include "util/primitives.h"
-#include "util/first_word.h"
 
 namespace {
 

@@ -16,9 +16,9 @@ class olm_icu final : public olm_dataset_component {
 
   // The files of the data set at `path`; the system data set's if that is empty. The schema stays
   // empty when none is found.
-  // If a download has no schema, prints "No ICU schema found for PATH". If the walk of its directory
-  // can't be started, prints "tz_icu::initialize: fts_open of DIRECTORY failed, REASON" and throws
-  // filesystem_error.
+  // If a download has no schema, prints "No ICU schema found for PATH". If the walk of its
+  // directory can't be started, prints "tz_icu::initialize: fts_open of DIRECTORY failed, REASON"
+  // and throws filesystem_error.
   explicit olm_icu(const std::string& path = {});
 
   // Returns whether `other` is an ICU component too and has the same schema.

@@ -2,8 +2,8 @@
 
 #include <err.h>
 
-#include "util/primitives.h"
 #include "util/first_word.h"
+#include "util/primitives.h"
 
 namespace {
 

@@ -1,10 +1,9 @@
 #pragma once
 
-// The filesystem layout: the fixed paths that the driver owns. Those of one kind of data stand with
-// that kind:
-//   dataset/zoneinfo.h  the system's tz database tree, a download's, and the link to the active one
-//   dataset/icu.h       the system's ICU directory, a download's, and the link to the active one,
-//                       with that link's place on older systems
+// The filesystem layout: the fixed paths that the driver owns. Those of a data set stand with it:
+//   dataset/zoneinfo.h  the system's tz database tree, and the link to the active one
+//   dataset/icu.h       the link to the active download's ICU files, and its place on older systems
+//   dataset/icu.cc      the system's ICU directory
 //   dataset/dataset.h   the directory that holds the downloads
 // No directory is ever created.
 namespace paths {

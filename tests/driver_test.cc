@@ -86,8 +86,8 @@ const boot_case typical_cases[] = {
      "~/icutz -> ../db/icu\n~/localtime -> ~/zoneinfo/Asia/Tokyo\n"},
 };
 
-const fault first_symlink = {"symlink", EROFS};
-const fault first_walk = {"fts_open", ENOMEM};
+const fault symlink_fails = {"symlink", EROFS};
+const fault walk_fails = {"fts_open", ENOMEM};
 
 // A second thing in a case is one that doesn't depend on the first.
 const boot_case rare_cases[] = {
@@ -151,16 +151,12 @@ const boot_case rare_cases[] = {
     {"two_ICU_links_and_no_downloads",
      "/var/db/icutz -> /usr\n~/icutz -> /\n~/localtime -> /usr/share/zoneinfo\n~/tz (absent)\n",
      correcting("~/zoneinfo"), "/var/db/icutz (absent)\n~/localtime -> ~/zoneinfo\n"},
-    {"rewrite_of_the_zone_fails", old_zone,
-     correcting("~/zoneinfo/Asia/Tokyo") + not_made("~/localtime", "~/zoneinfo/Asia/Tokyo") +
-         zone_reset(),
-     default_zone, 0, first_symlink},
     {"reset_fails", on_2016e,
      incompatible() + not_made("~/zoneinfo", "/usr/share/zoneinfo.default") + unable(), on_system,
-     0, first_symlink},
+     0, symlink_fails},
     {"walk_fails", newest_2016c,
      "tz_icu::initialize: fts_open of ~/tz/2016c/icutz failed, Cannot allocate memory\n" + unable(),
-     "", 0, first_walk},
+     "", 0, walk_fails},
 };
 
 class driver_test : public device, public ::testing::WithParamInterface<boot_case> {};
@@ -182,6 +178,9 @@ const text exceptions = default_zone + "~/icutz (absent)\n~/icutz -> ~/tz/2016a/
 class memory_test : public driver_test {};
 
 TEST_P(memory_test, each_allocation_fails_alone_or_with_all_that_follow) {
+#ifdef _LIBCPP_VERSION
+  GTEST_SKIP() << "libc++ crashes when it has no memory to begin a regular expression";
+#endif
   int status = 0;
   const auto ends = [&status](int result) {
     status = WEXITSTATUS(result);

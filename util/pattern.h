@@ -3,10 +3,9 @@
 #include <regex>
 
 // The standard library's traits without its questions to the locale. While it compiles a set, the
-// library asks for every character whether it is in a class and what it is equivalent to; the
-// answers would take longer than everything else that a run computes. A pattern must therefore do
-// without what needs them. The library is made to refuse a class or a named character where it asks
-// for one by name; the others give wrong matches.
+// library asks for every character whether it is in a class and what it is equivalent to. Without
+// the answers a run takes 0.1 ms less, a ninth of it. So a pattern must do without classes. A named
+// one such as [[:alpha:]] is refused; \d, \w, \s and \b compile and match wrongly.
 struct olm_pattern_traits : std::regex_traits<char> {
   template <typename iterator>
   static char_class_type lookup_classname(iterator /*first*/, iterator /*last*/,
@@ -27,7 +26,7 @@ struct olm_pattern_traits : std::regex_traits<char> {
 using olm_pattern = std::basic_regex<char, olm_pattern_traits>;
 
 // Returns `pattern` compiled by the ECMAScript grammar. It may hold characters, sets and ranges of
-// them, groups, alternatives and repetition, but nothing that depends on a class: no \d, \s, \w,
-// \b, [[:alpha:]], [[=a=]] or [[.a.]]. To be called when a run first needs the pattern, and once.
+// them, groups, alternatives and repetition, but no class. To be called when a run first needs the
+// pattern, and once.
 // Prints nothing. Throws std::regex_error for a malformed pattern.
 olm_pattern compile_pattern(const char* pattern);
