@@ -109,8 +109,6 @@ class device : public ::testing::Test {
       ADD_FAILURE() << "no right to chroot: be root, or allow user namespaces";
       std::exit(EXIT_FAILURE);
     }
-    const auto* const parts = ::testing::UnitTest::GetInstance()->current_test_info()->result();
-    const int parts_before = parts->total_part_count();
     const int next = dup(machine);
     planned_fault = plan;
     const int status = body();
@@ -118,8 +116,7 @@ class device : public ::testing::Test {
     planned_fault = {};
     EXPECT_LE(dup(machine), next + 1) << "a descriptor is left open";
     // A leak check at the exit needs the machine's /proc.
-    if (fchdir(machine) != 0 || chroot(".") != 0 || parts->total_part_count() > parts_before)
-      std::abort();
+    if (fchdir(machine) != 0 || chroot(".") != 0 || HasFailure()) std::abort();
     std::exit(as_planned ? status : no_fault);
   }
 

@@ -40,6 +40,7 @@ TEST_F(units_test, versions_are_strictly_ordered) {
   }
   EXPECT_EQ(olm_version("02016a.010"), olm_version("2016a.10"));
   EXPECT_THROW(olm_version("2016a.1.2147483648"), std::out_of_range);
+  EXPECT_THROW(compile_pattern("[[:alpha:]]"), std::regex_error);
 }
 
 TEST_F(units_test, other_texts_are_no_version_no_zoneinfo_link_and_no_download) {
@@ -78,10 +79,6 @@ TEST_F(units_test, an_error_is_told_and_thrown_and_stays_the_error_number) {
     }
     return last_walk_options ^ (FTS_COMFOLLOW | FTS_PHYSICAL | FTS_XDEV);
   });
-}
-
-TEST_F(units_test, a_pattern_with_a_class_is_refused) {
-  EXPECT_THROW(compile_pattern("[[:alpha:]]"), std::regex_error);
 }
 
 TEST_F(units_test, a_file_exists_that_may_not_be_read) {
@@ -148,6 +145,9 @@ TEST_F(units_test, data_sets) {
 }
 
 TEST_F(units_test, the_directories_have_class_d) {
+#ifdef OLMBOOT_DATA_PROTECTION
+  GTEST_SKIP() << "the kernel keeps the class";
+#endif
   put("~/tz (directory)\n");
   if (setxattr(outside("~/").c_str(), "user.protection_class", "B", 1, 0) != 0) GTEST_SKIP();
   run([] {
