@@ -115,7 +115,10 @@ class Device:
         if injection:
             command = ["strace", "-o", self.trace, *injection, *command]
         run = subprocess.run(command, capture_output=True, check=False, timeout=TIME_LIMIT)
-        return run.returncode, run.stderr.decode().splitlines() + [
+        # strace has a word to say about an address that 32 bits don't hold.
+        lines = [line for line in run.stderr.decode().splitlines()
+                 if not line.startswith("strace: ")]
+        return run.returncode, lines + [
             "on standard output: " + line for line in run.stdout.decode().splitlines()]
 
 
