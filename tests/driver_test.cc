@@ -4,6 +4,7 @@
 
 #include <cerrno>
 #include <csignal>
+#include <filesystem>
 #include <ostream>
 #include <sstream>
 #include <string>
