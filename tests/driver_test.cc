@@ -96,10 +96,14 @@ const boot_case rare_cases[] = {
      incompatible(), record + "2017a.1.0_2016c\n" + on_2016c},
     // The zone's link is replaced even if it works.
     {"no_format_file_and_relative_zone",
-     "/usr/share/icu/icutzformat.txt (absent)\n~/localtime -> ..~/zoneinfo\n" + on_2016e +
+     "/usr/share/icu/icutzformat.txt (absent)\n~/localtime -> ..~/zoneinfo\n" + on_2016a +
          newest_2016c,
-     incompatible() + refused("2016c", "2016e") + zone_reset(),
+     incompatible() + refused("2016c", "2016a") + zone_reset(),
      "~/icutz (absent)\n" + default_zone + "~/zoneinfo -> /usr/share/zoneinfo.default\n"},
+    // The name of the system's data file tells no format.
+    {"no_format_file_and_alien_download",
+     "/usr/share/icu/icutzformat.txt (absent)\n~/tz_latest -> ~/tz/2016e\n",
+     refused("2016e", "2016b.1.0")},
     {"name_of_one_character_and_zone_elsewhere",
      "~/tz_latest -> ~/tz/x\n~/localtime -> /mnt/usr/share/zoneinfo/Asia/Tokyo\n",
      unparsed("x") + "No ICU schema found for ~/tz/x\n" + refused("x", "2016b.1.0") + zone_reset(),
