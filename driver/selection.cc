@@ -30,7 +30,7 @@ std::string current_path_or_reset() {
 void write_record(const std::string& from, const std::string& to) {
   const std::string text = from + "_" + to;
   constexpr mode_t permissions = 0666;  // less the umask
-  // O_NONBLOCK keeps a named pipe from waiting for a reader; ftruncate(2) refuses it.
+  // O_NONBLOCK: a named pipe isn't waited for. If it has a reader, ftruncate(2) refuses it.
   constexpr int how = O_WRONLY | O_CREAT | O_NOFOLLOW | O_NONBLOCK | O_CLOEXEC;
   const int file = open(paths::record, how, permissions);
   if (file == -1) return;

@@ -38,6 +38,7 @@ class device : public ::testing::Test {
   }
   ~device() override { fs::remove_all(root); }
 
+  // Returns the text with each "~/" written out.
   static std::string full(const std::string& text) {
     return std::regex_replace(text, std::regex("~/"), "/var/db/timezone/");
   }
