@@ -1,12 +1,16 @@
 #pragma once
 
+#include <err.h>
 #include <fcntl.h>
 #include <gtest/gtest.h>
 #include <sched.h>
 #include <sys/stat.h>
+#include <sys/wait.h>
 #include <unistd.h>
 
+#include <csignal>
 #include <cstdlib>
+#include <cstring>
 #include <filesystem>
 #include <fstream>
 #include <map>
@@ -19,108 +23,92 @@
 int olmboot_main();
 
 namespace fs = std::filesystem;
+using text = std::string;
 
-// A throw-away device in a temporary directory. The test process only changes it from outside. A
-// child enters it and sees nothing else. A line tells what stands at a path:
-//   "PATH -> TARGET"   "PATH = TEXT"   "PATH (directory)"   "PATH (pipe)"   "PATH (absent)"
-// In all texts given "~/" is short for the program's own directory.
+// A throw-away device: a temporary directory that is the root while a test runs. A line tells what
+// stands at a path; "~/" is short for the program's own directory there and in what is printed:
+//   "PATH -> TARGET"   "PATH = TEXT"   "PATH (pipe)"   "PATH (absent)"
 class device : public ::testing::Test {
  protected:
-  using state = std::map<std::string, std::string>;  // what stands at each path
-  static constexpr int no_fault = 77;                // a child's status: no call failed as planned
-  static constexpr unsigned time_limit = 300;        // seconds
+  using state = std::map<text, text>;  // what stands at each path
+  static constexpr int no_fault = 77;  // a status: no call failed as planned
 
-  // An alarm ends a test that hangs, and before that a child that does.
-  device() : root(fs::canonical(fs::temp_directory_path()) / "olmboot_tests.XXXXXX") {
-    alarm(time_limit);
+  // An alarm ends a test that hangs, and before that a run that does.
+  device() {
+    alarm(300);
     umask(S_IWGRP | S_IWOTH);
-    if (mkdtemp(root.data()) == nullptr) std::abort();
+    if ((chroot("/") != 0 && unshare(CLONE_NEWUSER) != 0) || mkdtemp(root.data()) == nullptr ||
+        chdir(root.c_str()) != 0 || chroot(".") != 0) {
+      err(EXIT_FAILURE, "be root, or allow user namespaces: chroot to %s", root.c_str());
+    }
+    planned_fault = {};
   }
-  ~device() override { fs::remove_all(root); }
-
-  // Returns the text with each "~/" written out.
-  static std::string full(const std::string& text) {
-    return std::regex_replace(text, std::regex("~/"), "/var/db/timezone/");
+  ~device() override {
+    if (fchdir(machine) != 0 || chroot(".") != 0) std::abort();
+    fs::remove_all(root);
   }
 
-  // Returns where a path of the device is for the test process.
-  std::string outside(const std::string& path) const { return root + full(path); }
+  static text full(const text& lines) {
+    return std::regex_replace(lines, std::regex("~/"), "/var/db/timezone/");
+  }
 
-  // Puts on the device what the lines tell, with the parent directories. Files are dated 2040,
-  // which 32 bits don't hold.
-  void put(const std::string& lines) const {
+  // Puts on the device what the lines tell. Files are dated 2040, which 32 bits don't hold.
+  static void put(const text& lines) {
     std::istringstream stream(full(lines));
-    for (std::string word, what; stream >> word;) {
-      std::getline(stream >> std::ws, what);
-      const fs::path path = root + word;
-      // A link on the device must not lead out of it.
-      if (fs::weakly_canonical(path.parent_path()) != path.parent_path()) std::abort();
+    for (text path, what; stream >> path && std::getline(stream >> std::ws, what);) {
       fs::remove_all(path);
-      if (what == "(absent)") continue;
-      fs::create_directories(what == "(directory)" ? path : path.parent_path());
+      fs::create_directories(fs::path(path).parent_path());
       if (what == "(pipe)") mkfifo(path.c_str(), S_IRUSR | S_IWUSR | S_IRGRP | S_IROTH);
-      const std::string text = what.substr(what.find(' ') + 1);
-      if (what[0] == '-') fs::create_symlink(text, path);
+      if (what[0] == '-') fs::create_symlink(what.substr(3), path);
       if (what[0] != '=') continue;
-      std::ofstream(path) << text;
+      std::ofstream(path) << what.substr(2);
       const timespec dates[] = {{2208988800, 0}, {2208988800, 0}};
       utimensat(AT_FDCWD, path.c_str(), dates, 0);
     }
   }
 
-  state look() const {
+  static text what_is(const fs::directory_entry& entry) {
+    if (entry.is_symlink()) return "-> " + fs::read_symlink(entry).string();
+    if (!entry.is_regular_file()) return "(directory or pipe)";
+    return "= " + (std::ostringstream() << std::ifstream(entry.path()).rdbuf()).str();
+  }
+
+  static state look() {
     state found;
-    for (const auto& entry : fs::recursive_directory_iterator(root)) {
-      std::string& what = found[entry.path().string().substr(root.size())];
-      if (entry.is_symlink()) {
-        what = "-> " + fs::read_symlink(entry).string();
-      } else if (entry.is_regular_file()) {
-        what = "= " + (std::ostringstream() << std::ifstream(entry.path()).rdbuf()).str();
-      } else {
-        what = entry.is_directory() ? "(directory)" : "(pipe)";
-      }
-    }
+    for (const auto& entry : fs::recursive_directory_iterator("/"))
+      found[entry.path()] = what_is(entry);
     return found;
   }
 
   // Returns the lines of what differs from `before`, in the order of the paths.
-  std::string changes_since(state before) const {
+  static text changes_since(state before) {
     state now = look();
     for (const auto& [path, what] : before) now.try_emplace(path, "(absent)");
-    std::string changes;
-    for (const auto& [path, what] : now) {
+    text changes;
+    for (const auto& [path, what] : now)
       if (before[path] != what) changes.append(path + " ").append(what + "\n");
-    }
     return changes;
   }
 
-  // Calls `body` in a child that sees the device alone. Expects its checks to hold, 0 as its
-  // result, and `last_line` as the end of what it prints.
-  void run(int body(), const std::string& last_line = "") const {
-    EXPECT_EXIT(enter(body, {}), ::testing::ExitedWithCode(0), last_line + "$");
-  }
-
-  // Makes the device this process's root, in a user namespace if it isn't run by root. Ends with
-  // what `body` returns, or no_fault. Like main, lets nothing that `body` throws pass.
-  [[noreturn]] void enter(int body(), const fault& plan) const noexcept {
-    alarm(time_limit / 2);
-    const int machine = open("/", O_RDONLY);
-    if (geteuid() != 0) unshare(CLONE_NEWUSER);
-    if (chroot(root.c_str()) != 0 || chdir("/") != 0) {
-      ADD_FAILURE() << "no right to chroot: be root, or allow user namespaces";
-      std::exit(EXIT_FAILURE);
+  // Runs the program in a child. Returns its status, no_fault, or 128 and the signal that ended it.
+  // Like main, lets nothing that is thrown pass.
+  static int boot(const fault& plan = {}) noexcept {
+    std::memset(printed, 0, printed_size);
+    if (fork() == 0) {
+      alarm(150);
+      close(STDIN_FILENO);  // so that it is the next to be opened
+      planned_fault = plan;
+      const int status = olmboot_main();
+      if (std::raise(SIGPIPE) + std::raise(SIGXFSZ) != 0) std::abort();  // both are ignored
+      if (dup(STDERR_FILENO) != STDIN_FILENO) std::abort();  // a descriptor is left open
+      _exit(plan.call.empty() || planned_fault.seen >= plan.first ? status : no_fault);
     }
-    const int next = dup(machine);
-    planned_fault = plan;
-    const int status = body();
-    const bool as_planned = plan.call.empty() || planned_fault.struck;
-    planned_fault = {};
-    EXPECT_LE(dup(machine), next + 1) << "a descriptor is left open";
-    // A leak check at the exit needs the machine's /proc.
-    if (fchdir(machine) != 0 || chroot(".") != 0 || HasFailure()) std::abort();
-    std::exit(as_planned ? status : no_fault);
+    int status = 0;
+    wait(&status);
+    return WIFEXITED(status) ? WEXITSTATUS(status) : 128 + WTERMSIG(status);
   }
 
  private:
-  std::string root;
+  static inline const int machine = open("/", O_RDONLY | O_CLOEXEC);
+  text root = fs::canonical(fs::temp_directory_path()) / "olmboot_tests.XXXXXX";
 };

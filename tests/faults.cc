@@ -3,37 +3,22 @@
 
 #include "faults.h"
 
-#include <dlfcn.h>
 #include <err.h>
 #include <fcntl.h>
-#include <fts.h>
 #include <sys/syscall.h>
 #include <unistd.h>
 
-#include <cerrno>
 #include <cstdarg>
 #include <cstdio>
 #include <cstdlib>
+#include <cstring>
 #include <new>
 
 static bool fails(std::string_view call) {
-  fault& plan = planned_fault;
-  if (plan.call != call) return false;
-  ++plan.seen;
-  if (plan.and_later ? plan.seen < plan.first : plan.seen != plan.first) return false;
-  plan.struck = true;
-  errno = plan.error;
-  return true;
-}
-
-extern "C" {
-
-FTS* fts_open(char* const* paths, int how, int (*order)(const FTSENT**, const FTSENT**)) {
-  last_walk_options = how;
-  // The second is what it is named where narrow offsets and times are the default.
-  void* const hidden = dlsym(RTLD_NEXT, sizeof(long) >= 8 ? "fts_open" : "__fts64_open_time64");
-  return fails("fts_open") ? nullptr
-                           : reinterpret_cast<decltype(&fts_open)>(hidden)(paths, how, order);
+  if (planned_fault.call != call) return false;
+  const int seen = ++planned_fault.seen;
+  errno = planned_fault.error;  // of no use if the call succeeds
+  return planned_fault.and_later ? seen >= planned_fault.first : seen == planned_fault.first;
 }
 
 // The file streams of libstdc++ call it, those of libc++ don't.
@@ -51,18 +36,19 @@ int symlink(const char* target, const char* path) noexcept {
 
 int unlink(const char* path) noexcept { return fails("unlink") ? -1 : unlinkat(AT_FDCWD, path, 0); }
 
-// Prints the message alone.
+ssize_t write(int descriptor, const void* buffer, std::size_t size) {
+  return fails("write") ? -1 : syscall(SYS_write, descriptor, buffer, size);
+}
+
 void warn(const char* format, ...) {
   last_warned_error = errno;
   va_list arguments;
   va_start(arguments, format);
-  std::vfprintf(stderr, format, arguments);
+  char* const end = printed + std::strlen(printed);
+  end[std::vsnprintf(end, printed_size - std::strlen(printed), format, arguments)] = '\n';
   va_end(arguments);
-  std::fputc('\n', stderr);
   errno = 0;  // as the C library's may change it
 }
-
-}  // extern "C"
 
 void* operator new(std::size_t size) {
   void* const memory = fails("operator new") ? nullptr : std::malloc(size);
