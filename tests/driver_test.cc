@@ -75,9 +75,9 @@ const boot_case cases[] = {
          on_system},
     {"no_format_and_alien_download", no_format + "~/tz_latest -> ~/tz/2016e\n",
      refused("2016e", "2016b.1.0")},  // the name of the system's data file tells no format
-    {"short_name", "~/tz_latest -> ~/tz/x\n~/localtime -> /mnt/usr/share/zoneinfo/Asia/Tokyo\n",
-     unparsed("x") + "No ICU schema found for ~/tz/x\n" + refused("x", "2016b.1.0") + zone_reset() +
-         default_zone},
+    {"bad_name", "~/tz_latest -> ~/tz/2016c.1.\n~/localtime -> /mnt/usr/share/zoneinfo/Asia\n",
+     unparsed("2016c.1.") + "No ICU schema found for ~/tz/2016c.1.\n" +
+         refused("2016c.1.", "2016b.1.0") + zone_reset() + default_zone},
     {"slash_and_no_zone", "~/tz_latest -> ~/tz/2016c/\n~/localtime -> /usr/share/zoneinfo/None\n",
      unparsed("2016c/") + refused("2016c/", "2016b.1.0") + correcting("~/zoneinfo/None") +
          zone_reset() + default_zone},
