@@ -104,7 +104,7 @@ const boot_case cases[] = {
     {"directories_at_old_ICU_entries", "/var/db/icutz/file = text\n/var/db/icu/file = text\n",
      unread("/var/db/icutz") + "Could not migrate /var/db/icutz to ~/icutz\n" +
          unremoved("/var/db/icutz") + "Could not remove /var/db/icutz\n"},
-    {"directory_at_zone", "~/localtime (absent)\n~/localtime/file = text\n",
+    {"directory_at_local_time_link", "~/localtime (absent)\n~/localtime/file = text\n",
      unread("~/localtime") + zone_reset() + unmade(default_zone), 1},
     {"pipe_at_record", newest_2016c + "~/TZVersionDiffRecord (pipe)\n", on_2016c},
     {"link_at_record", newest_2016c + "~/TZVersionDiffRecord -> f\n~/f = text\n", on_2016c},
