@@ -72,7 +72,7 @@ const boot_case cases[] = {
      incompatible() + record + "2017a.1.0_2016c\n" + on_2016c},
     {"no_format", no_format + "~/localtime -> ..~/zoneinfo\n" + on_2016a + newest_2016c,
      incompatible() + refused("2016c", "2016a") + zone_reset() + no_icutz + default_zone +
-         on_system},
+         on_system},  // the zone's link goes even if it works; the update is named first
     {"no_format_and_alien_download", no_format + "~/tz_latest -> ~/tz/2016e\n",
      refused("2016e", "2016b.1.0")},  // the name of the system's data file tells no format
     {"bad_name", "~/tz_latest -> ~/tz/2016c.1.\n~/localtime -> /mnt/usr/share/zoneinfo/Asia\n",
@@ -100,7 +100,7 @@ const boot_case cases[] = {
      unread("~/zoneinfo") + invalid() + zoneinfo_stays() + unable() + zoneinfo_stays(), 1},
     {"directory_at_ICU_link", newest_2016c + "~/icutz/file = text\n/var/db/icutz -> /none\n",
      icutz_stays() + unmade("~/icutz -> ~/tz/2016c/icutz\n") + unable() +
-         icutz_stays()},  // no record
+         icutz_stays()},  // the old link is not tried, the record not written
     {"directories_at_old_ICU_entries", "/var/db/icutz/file = text\n/var/db/icu/file = text\n",
      unread("/var/db/icutz") + "Could not migrate /var/db/icutz to ~/icutz\n" +
          unremoved("/var/db/icutz") + "Could not remove /var/db/icutz\n"},
