@@ -59,7 +59,7 @@ TEST_F(units_test, an_error_is_told_and_thrown_and_stays_the_error_number) {
   }
 }
 
-TEST_F(units_test, only_a_word_that_ends_is_read) {
+TEST_F(units_test, only_a_word_that_ends_is_read_and_an_unreadable_file_exists) {
   put("/link -> file\n/blank = \t\n/loop -> loop\n/pipe (pipe)\n/long = " + text(9000, 'x') + "\n");
   for (const auto* path : {"/blank", "/none", "/loop", "/pipe", "/"})
     EXPECT_EQ(read_first_word(path), "") << path;
