@@ -68,7 +68,9 @@ void olm_icu::initialize() {
 
 std::string olm_icu::schema_of_data_file() const {
   const directory_walk walk = open_walk(directory);
-  while (const FTSENT* const entry = fts_read(walk.get())) {
+  while (FTSENT* const entry = fts_read(walk.get())) {
+    // What lies deeper is never chosen, however much it is.
+    if (entry->fts_level > 0) fts_set(walk.get(), entry, FTS_SKIP);
     std::cmatch results;
     if (is_public_file_at_top(*entry) &&
         std::regex_match(entry->fts_name, results, data_file_pattern())) {
