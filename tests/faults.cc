@@ -1,6 +1,3 @@
-// A fortified C library defines some of these functions in its headers.
-#undef _FORTIFY_SOURCE
-
 #include "faults.h"
 
 #include <err.h>
@@ -50,9 +47,15 @@ void warn(const char* format, ...) {
   errno = 0;  // as the C library's may change it
 }
 
+// All forms that can meet. The forms for arrays come to these or, under a sanitizer, stay among
+// themselves; so do those for greater alignments.
+void* operator new(std::size_t size, const std::nothrow_t& /*tag*/) noexcept {
+  return fails("operator new") ? nullptr : std::malloc(size);
+}
 void* operator new(std::size_t size) {
-  void* const memory = fails("operator new") ? nullptr : std::malloc(size);
+  void* const memory = operator new(size, std::nothrow);
   return memory != nullptr ? memory : throw std::bad_alloc();
 }
 void operator delete(void* memory) noexcept { std::free(memory); }
 void operator delete(void* memory, std::size_t /*size*/) noexcept { std::free(memory); }
+void operator delete(void* memory, const std::nothrow_t& /*tag*/) noexcept { std::free(memory); }

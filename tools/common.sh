@@ -1,17 +1,31 @@
-# What the commands in this folder share. To be sourced first, as `. common.sh "$@"`.
+# What the commands of this project share. To be sourced first, with the command's arguments.
 # shellcheck shell=bash
 
 export LC_ALL=C
-project=$(cd "$(dirname "${BASH_SOURCE[0]}")/.." && pwd)
-build=${OLMBOOT_BUILD:-$project/build}
+unset CDPATH
+project=$(dirname "$(dirname "$(readlink -f "${BASH_SOURCE[0]}")")")
+build=$(realpath -m "${OLMBOOT_BUILD:-$project/build}")
 
-# The comment at the top of a command is its help.
+fail() {
+  printf '%s: %s\n' "$(basename "$0")" "$1" >&2
+  exit 1
+}
+
+# Ends the command for arguments that it doesn't know.
+refuse() {
+  printf '%s: %s; --help tells more\n' "$(basename "$0")" "$1" >&2
+  exit 2
+}
+
+# The comment at the top of a command is its help. The first line of it names the arguments.
+usage=$(sed -n '2s/^# //p' "$0")
 case ${1-} in
   -h | --help)
     sed -n '2,/^[^#]/s/^# \{0,1\}//p' "$0"
     exit
     ;;
 esac
+[ $# = 0 ] || [[ $usage == *' '* ]] || refuse "unknown argument '$1'"
 
 # What is named here is removed when the command ends, however it ends.
 remove_at_end=()
@@ -20,10 +34,10 @@ trap 'exit 129' HUP
 trap 'exit 130' INT
 trap 'exit 143' TERM
 
-fail() {
-  printf '%s: %s\n' "$(basename "$0")" "$1" >&2
-  exit 1
-}
+# All that a command or what it starts leaves in the temporary directory goes with it.
+TMPDIR=$(mktemp -d 2>/dev/null) && remove_at_end+=("$TMPDIR") && export TMPDIR &&
+  head -c 1000000 /dev/zero 2>/dev/null >"$TMPDIR/room" && rm "$TMPDIR/room" ||
+  fail "the temporary directory is missing or full; name another folder in TMPDIR"
 
 # Installs those of the given Debian packages that are missing; says so, or what to do where it
 # can't. On another machine it says what is needed and goes on.
@@ -39,15 +53,16 @@ need_packages() {
       missing+=("$package")
   done
   [ ${#missing[@]} -gt 0 ] || return 0
+  local by_hand="run as root: apt-get update && apt-get install ${missing[*]}"
   if [ "$(id -u)" != 0 ]; then
-    command -v sudo >/dev/null || fail "not root; run as root: apt-get install ${missing[*]}"
+    command -v sudo >/dev/null || fail "packages are missing; $by_hand"
     as_root=(sudo)
   fi
   echo "Installing what is missing: ${missing[*]}"
   if ! "${as_root[@]}" apt-get update -qq >&2 ||
     ! "${as_root[@]}" env DEBIAN_FRONTEND=noninteractive \
       apt-get install -y -qq --no-install-recommends "${missing[@]}" >/dev/null; then
-    fail "that failed; run as root: apt-get install ${missing[*]}"
+    fail "that failed; $by_hand"
   fi
 }
 
@@ -60,43 +75,70 @@ as_root() {
 # Ends the command where it could not enter a throw-away root.
 need_root() {
   as_root chroot / true 2>/dev/null ||
-    fail "this user can't enter a throw-away root; run as root, or allow user namespaces"
+    fail "this user can't enter a throw-away root; run as root, or outside of any chroot with user namespaces"
+}
+
+# Makes the build folder.
+need_build_folder() {
+  if ! { mkdir -p "$build" && touch "$build/lock"; } 2>/dev/null; then
+    fail "$build can't be written; name another folder in OLMBOOT_BUILD"
+  fi
 }
 
 # Configures and builds the preset $1 in $build/$1, with further CMake options. Shows the output only
 # when that fails, and warnings always. One command builds at a time.
 build_preset() {
-  local log status=0
-  if ! { mkdir -p "$build" && touch "$build/lock"; } 2>/dev/null; then
-    fail "$build can't be written; name another folder in OLMBOOT_BUILD"
-  fi
+  local log=$TMPDIR/build.log status=0
+  need_build_folder
   exec 9>"$build/lock"
   if ! flock -n 9; then
     echo "Another command is building; waiting for it."
     flock 9
   fi
-  log=$(mktemp)
-  remove_at_end+=("$log")
+  echo "Building preset '$1'"
   (cd "$project" && cmake --preset "$1" -B "$build/$1" "${@:2}" &&
     cmake --build "$build/$1" -j "$(nproc)") >"$log" 2>&1 || status=$?
-  if [ $status = 0 ]; then grep -A 3 'warning:' "$log" || true; else cat "$log" >&2; fi
-  rm "$log"
-  [ $status = 0 ] || fail "the build of preset '$1' failed"
+  if [ $status = 0 ]; then
+    grep -A 3 'warning:' "$log" || true
+  else
+    # clang-tidy counts what it found in the system's headers and doesn't show.
+    grep -v '^[0-9]* warnings* generated\.$' "$log" >&2 || true
+    fail "the build of preset '$1' failed"
+  fi
   exec 9>&-
+}
+
+# Makes a small Debian system of release $1 with the packages $2, $3, ..., and names it in $debian. It
+# stays in the build folder for the next time. To be called by root.
+make_debian() {
+  local release=$1 packages=${*:2} new
+  debian=$build/debian/$release${packages:+.$(cksum <<<"$packages" | cut -d ' ' -f 1)}
+  [ ! -e "$debian" ] || return 0
+  need_packages debootstrap
+  [ -e "/usr/share/debootstrap/scripts/${release//\//.}" ] || fail "there is no release '$release'"
+  echo "Making a Debian system in $debian"
+  need_build_folder
+  mkdir -p "$build/debian"
+  new=$(mktemp -d "$debian.XXXXXX")
+  remove_at_end+=("$new")
+  # What debootstrap mounts goes with the namespace.
+  unshare --mount debootstrap --variant=minbase ${packages:+"--include=${packages// /,}"} "$release" "$new" \
+    >"$TMPDIR/debootstrap" 2>&1 ||
+    fail "debootstrap failed in $debian: $(grep . "$TMPDIR/debootstrap" | tail -n 1)"
+  chmod 755 "$new"
+  mv -T "$new" "$debian"
 }
 
 # Makes an empty throw-away root and names it in $root. It has a mark, which the benchmark looks for
 # before it removes anything.
 make_root() {
-  root=$(mktemp -d)
-  remove_at_end+=("$root")
-  chmod 755 "$root"
-  mkdir -p "$root/tmp" "$root/sbin" "$root/usr/share/icu" "$root/usr/share/zoneinfo.default" \
-    "$root/var/db/timezone/tz"
+  umask 022
+  root=$TMPDIR/root
+  mkdir -p "$root"/{tmp,sbin,usr/share/{icu,zoneinfo.default},var/db/timezone/tz}
   touch "$root/throw-away"
   install "$(type -P true)" "$root/tmp/true"
   "$root/tmp/true" 2>/dev/null ||
-    fail "programs can't be run in ${TMPDIR:-/tmp} (noexec?); name another folder in TMPDIR"
+    fail "programs can't be run in the temporary directory (noexec?); name another folder in TMPDIR"
 }
 
 # Puts the program $1 into the root as $2, with the libraries that it needs.

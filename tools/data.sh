@@ -2,7 +2,8 @@
 # with one rule changed. To be sourced after common.sh.
 # shellcheck shell=bash disable=SC2034,SC2154
 
-source_of_rules=/usr/share/zoneinfo/tzdata.zi
+machine_tree=/usr/share/zoneinfo
+source_of_rules=$machine_tree/tzdata.zi
 # The rule by which most of North America turns its clocks forward, and a later date for it: as the tz
 # database has it, and as ICU does, whose months begin with 0.
 rule='^R u 2007 ma - Mar Su>=8 2 1 D$'
@@ -19,14 +20,16 @@ icu_info() { icuinfo 2>/dev/null | sed -n "s/.*\"$1\">\(.*\)<.*/\1/p"; }
 compile_tree() {
   grep -q "$rule" "$source_of_rules" || fail "the rule to be changed is not in $source_of_rules"
   mkdir -p "$1"
-  zic -d "$1" <(sed "s/$rule/$changed_rule/" "$source_of_rules")
+  sed "s/$rule/$changed_rule/" "$source_of_rules" >"$1/tzdata.zi"
+  zic -b fat -d "$1" "$1/tzdata.zi"
+  cp "$machine_tree"/{zone1970.tab,zone.tab,iso3166.tab,leapseconds} "$1"
   echo "$2" >"$1/+VERSION"
 }
 
 # Compiles ICU's rules, changed in the same way, into the directory $1, as release $2. If there is $3,
 # packs them as the data file of that format, too.
 compile_icu() {
-  local text=$root/tmp/zoneinfo64.txt
+  local text=$TMPDIR/zoneinfo64.txt
   mkdir -p "$1"
   derb -c -s - zoneinfo64 | sed -e "s/$icu_rule/$changed_icu_rule/" \
     -e 's/^zoneinfo64{/zoneinfo64:table(nofallback){/' \
@@ -34,7 +37,7 @@ compile_icu() {
   grep -q "$changed_icu_rule" "$text" || fail "the rule to be changed is not in ICU's data"
   genrb -q -d "$1" "$text"
   [ $# -lt 3 ] || {
-    echo zoneinfo64.res >"$root/tmp/list.txt"
-    icupkg -s "$1" -a "$root/tmp/list.txt" new "$1/icutz$3.dat"
+    echo zoneinfo64.res >"$TMPDIR/list.txt"
+    icupkg -s "$1" -a "$TMPDIR/list.txt" new "$1/icutz$3.dat"
   }
 }
