@@ -34,10 +34,14 @@ trap 'exit 129' HUP
 trap 'exit 130' INT
 trap 'exit 143' TERM
 
-# All that a command or what it starts leaves in the temporary directory goes with it.
-TMPDIR=$(mktemp -d 2>/dev/null) && remove_at_end+=("$TMPDIR") && export TMPDIR &&
-  head -c 1000000 /dev/zero 2>/dev/null >"$TMPDIR/room" && rm "$TMPDIR/room" ||
-  fail "the temporary directory is missing or full; name another folder in TMPDIR"
+# All that a command and what it starts leaves in the temporary directory goes with it.
+if ! TMPDIR=$(mktemp -d 2>/dev/null) || ! head -c 1000000 /dev/zero 2>/dev/null >"$TMPDIR/room"; then
+  rm -rf "$TMPDIR"
+  fail "the temporary directory is missing or full; name another one in TMPDIR"
+fi
+rm "$TMPDIR/room"
+remove_at_end+=("$TMPDIR")
+export TMPDIR
 
 # Installs those of the given Debian packages that are missing; says so, or what to do where it
 # can't. On another machine it says what is needed and goes on.
@@ -101,8 +105,8 @@ build_preset() {
   if [ $status = 0 ]; then
     grep -A 3 'warning:' "$log" || true
   else
-    # clang-tidy counts what it found in the system's headers and doesn't show.
-    grep -v '^[0-9]* warnings* generated\.$' "$log" >&2 || true
+    # Without what went well, and clang-tidy's count of what it found in the system's headers.
+    grep -vE '^(-- |\[ *[0-9]+%\] |[0-9]+ warnings?( and [0-9]+ errors?)? generated)' "$log" >&2 || true
     fail "the build of preset '$1' failed"
   fi
   exec 9>&-
@@ -138,7 +142,7 @@ make_root() {
   touch "$root/throw-away"
   install "$(type -P true)" "$root/tmp/true"
   "$root/tmp/true" 2>/dev/null ||
-    fail "programs can't be run in the temporary directory (noexec?); name another folder in TMPDIR"
+    fail "programs can't be run in the temporary directory (noexec?); name another one in TMPDIR"
 }
 
 # Puts the program $1 into the root as $2, with the libraries that it needs.
