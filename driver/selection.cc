@@ -26,10 +26,10 @@ std::string current_path_or_reset() {
   }
 }
 
-// Whether `file` is open on a regular file with one name: a second name may be anybody's file.
-bool is_file_of_its_own(int file) {
+// Whether the open `file` has no other name. With one it may be anybody's.
+bool has_one_name(int file) {
   struct stat status;
-  return fstat(file, &status) == 0 && S_ISREG(status.st_mode) && status.st_nlink == 1;
+  return fstat(file, &status) == 0 && status.st_nlink == 1;
 }
 
 // Replaces the record of the last update by `from`, "_" and `to`, without a line end. Not by a
@@ -37,11 +37,11 @@ bool is_file_of_its_own(int file) {
 void write_record(const std::string& from, const std::string& to) {
   const std::string text = from + "_" + to;
   constexpr mode_t permissions = 0666;  // less the umask
-  // O_NONBLOCK: a named pipe isn't waited for.
+  // O_NONBLOCK: a named pipe isn't waited for. If it has a reader, ftruncate(2) refuses it.
   constexpr int how = O_WRONLY | O_CREAT | O_NOFOLLOW | O_NONBLOCK | O_CLOEXEC;
   const int file = open(paths::record, how, permissions);
   if (file == -1) return;
-  if (is_file_of_its_own(file) && ftruncate(file, 0) == 0) {
+  if (has_one_name(file) && ftruncate(file, 0) == 0) {
     [[maybe_unused]] const ssize_t written = write(file, text.data(), text.size());
   }
   close(file);

@@ -4,10 +4,12 @@
 #include <fcntl.h>
 #include <gtest/gtest.h>
 #include <sched.h>
+#include <sys/mman.h>
 #include <sys/stat.h>
 #include <sys/wait.h>
 #include <unistd.h>
 
+#include <cerrno>
 #include <csignal>
 #include <cstdlib>
 #include <cstring>
@@ -17,26 +19,41 @@
 #include <regex>
 #include <sstream>
 #include <string>
-
-#include "faults.h"
+#include <string_view>
 
 int olmboot_main();
 
 namespace fs = std::filesystem;
-using text = std::string;
+using std::string;
+
+// Faults on demand. faults.cc stands in for these functions of the whole program: read, symlink,
+// write, operator new, and warn, which never fails.
+struct fault {
+  std::string_view call;  // whose calls fail; none's if empty
+  int error = 0;          // the error number; operator new throws std::bad_alloc instead
+  int first = 1;          // which of its calls fails, counted from 1
+  int seen = 0;           // how many of its calls there were
+};
+inline fault planned_fault;
+
+// The messages of warn, a line each, in memory that a forked child shares.
+inline constexpr std::size_t printed_size = 1 << 18;
+inline char* const printed = static_cast<char*>(
+    mmap(nullptr, printed_size, PROT_READ | PROT_WRITE, MAP_SHARED | MAP_ANONYMOUS, -1, 0));
+inline int last_warned_error;  // the error number that warn was to tell
 
 // A throw-away device: a temporary directory that is the root while a test runs. A line tells what
 // stands at a path; "~/" is short for the program's own directory there and in what is printed:
-//   "PATH -> TARGET"   "PATH = TEXT"   "PATH (pipe)"   "PATH (absent)"
+//   "PATH -> TARGET"   "PATH = TEXT"   "PATH & OTHER_NAME"   "PATH (KIND)"
+// KIND is pipe, directory or absent.
 class device : public ::testing::Test {
  protected:
-  using state = std::map<text, text>;  // what stands at each path
-  static constexpr int no_fault = 77;  // a status: no call failed as planned
+  using state = std::map<string, string>;  // what stands at each path
+  static constexpr int no_fault = 77;      // a status: no call failed as planned
 
-  // An alarm ends a test that hangs, and before that a run that does.
   device() {
-    alarm(300);
-    umask(S_IWGRP | S_IWOTH);
+    std::signal(SIGPIPE, SIG_IGN);
+    umask(S_IWOTH);
     if ((chroot("/") != 0 && unshare(CLONE_NEWUSER) != 0) || mkdtemp(root.data()) == nullptr ||
         chdir(root.c_str()) != 0 || chroot(".") != 0) {
       err(EXIT_FAILURE, "be root, or allow user namespaces: chroot to %s", root.c_str());
@@ -48,17 +65,19 @@ class device : public ::testing::Test {
     fs::remove_all(root);
   }
 
-  static text full(const text& lines) {
+  static string full(const string& lines) {
     return std::regex_replace(lines, std::regex("~/"), "/var/db/timezone/");
   }
 
   // Puts on the device what the lines tell. Files are dated 2040, which 32 bits don't hold.
-  static void put(const text& lines) {
+  static void put(const string& lines) {
     std::istringstream stream(full(lines));
-    for (text path, what; stream >> path && std::getline(stream >> std::ws, what);) {
+    for (string path, what; stream >> path && std::getline(stream >> std::ws, what);) {
       fs::remove_all(path);
       fs::create_directories(fs::path(path).parent_path());
       if (what == "(pipe)") mkfifo(path.c_str(), S_IRUSR | S_IWUSR | S_IRGRP | S_IROTH);
+      if (what == "(directory)") fs::create_directory(path);
+      if (what[0] == '&') fs::create_hard_link(what.substr(2), path);
       if (what[0] == '-') fs::create_symlink(what.substr(3), path);
       if (what[0] != '=') continue;
       std::ofstream(path) << what.substr(2);
@@ -67,9 +86,10 @@ class device : public ::testing::Test {
     }
   }
 
-  static text what_is(const fs::directory_entry& entry) {
+  static string what_is(const fs::directory_entry& entry) {
     if (entry.is_symlink()) return "-> " + fs::read_symlink(entry).string();
     if (!entry.is_regular_file()) return "(directory or pipe)";
+    if (entry.status().permissions() != fs::perms{0664}) return "(not the mode of a new file)";
     return "= " + (std::ostringstream() << std::ifstream(entry.path()).rdbuf()).str();
   }
 
@@ -81,10 +101,10 @@ class device : public ::testing::Test {
   }
 
   // Returns the lines of what differs from `before`, in the order of the paths.
-  static text changes_since(state before) {
+  static string changes_since(state before) {
     state now = look();
     for (const auto& [path, what] : before) now.try_emplace(path, "(absent)");
-    text changes;
+    string changes;
     for (const auto& [path, what] : now)
       if (before[path] != what) changes.append(path + " ").append(what + "\n");
     return changes;
@@ -94,12 +114,15 @@ class device : public ::testing::Test {
   // Like main, lets nothing that is thrown pass.
   static int boot(const fault& plan = {}) noexcept {
     std::memset(printed, 0, printed_size);
+    std::fflush(stdout);
     if (fork() == 0) {
-      alarm(150);
-      close(STDIN_FILENO);  // so that it is the next to be opened
+      alarm(150);  // for a run that hangs
+      std::signal(SIGPIPE, SIG_DFL);
+      dup2(machine, STDOUT_FILENO);  // where nothing can be written
+      close(STDIN_FILENO);           // so that it is the next to be opened
       planned_fault = plan;
       const int status = olmboot_main();
-      if (std::raise(SIGPIPE) + std::raise(SIGXFSZ) != 0) std::abort();  // both are ignored
+      if (std::fflush(stdout) + std::raise(SIGXFSZ) != 0) std::abort();
       if (dup(STDERR_FILENO) != STDIN_FILENO) std::abort();  // a descriptor is left open
       _exit(plan.call.empty() || planned_fault.seen >= plan.first ? status : no_fault);
     }
@@ -108,7 +131,8 @@ class device : public ::testing::Test {
     return WIFEXITED(status) ? WEXITSTATUS(status) : 128 + WTERMSIG(status);
   }
 
+  static inline const int machine = open("/", O_RDONLY | O_CLOEXEC);  // outside the device
+
  private:
-  static inline const int machine = open("/", O_RDONLY | O_CLOEXEC);
-  text root = fs::canonical(fs::temp_directory_path()) / "olmboot_tests.XXXXXX";
+  string root = fs::canonical(fs::temp_directory_path()) / "olmboot_tests.XXXXXX";
 };

@@ -1,21 +1,16 @@
-#include "faults.h"
-
-#include <err.h>
-#include <fcntl.h>
 #include <sys/syscall.h>
-#include <unistd.h>
 
 #include <cstdarg>
 #include <cstdio>
-#include <cstdlib>
-#include <cstring>
 #include <new>
+
+#include "device.h"
 
 static bool fails(std::string_view call) {
   if (planned_fault.call != call) return false;
   const int seen = ++planned_fault.seen;
   errno = planned_fault.error;  // of no use if the call succeeds
-  return planned_fault.and_later ? seen >= planned_fault.first : seen == planned_fault.first;
+  return seen == planned_fault.first;
 }
 
 // The file streams of libstdc++ call it, those of libc++ don't.
@@ -23,15 +18,9 @@ ssize_t read(int descriptor, void* buffer, std::size_t size) {
   return fails("read") ? -1 : syscall(SYS_read, descriptor, buffer, size);
 }
 
-ssize_t readlink(const char* path, char* buffer, std::size_t size) noexcept {
-  return fails("readlink") ? -1 : readlinkat(AT_FDCWD, path, buffer, size);
-}
-
 int symlink(const char* target, const char* path) noexcept {
   return fails("symlink") ? -1 : symlinkat(target, AT_FDCWD, path);
 }
-
-int unlink(const char* path) noexcept { return fails("unlink") ? -1 : unlinkat(AT_FDCWD, path, 0); }
 
 ssize_t write(int descriptor, const void* buffer, std::size_t size) {
   return fails("write") ? -1 : syscall(SYS_write, descriptor, buffer, size);
@@ -44,7 +33,8 @@ void warn(const char* format, ...) {
   char* const end = printed + std::strlen(printed);
   end[std::vsnprintf(end, printed_size - std::strlen(printed), format, arguments)] = '\n';
   va_end(arguments);
-  errno = 0;  // as the C library's may change it
+  std::raise(SIGPIPE);  // as if nobody read it
+  errno = 0;            // as the C library's may change it
 }
 
 // All forms that can meet. The forms for arrays come to these or, under a sanitizer, stay among

@@ -3,15 +3,16 @@
 
 import argparse
 import collections
-import concurrent.futures
+import itertools
+import multiprocessing.pool
 import os
-import queue
 import re
 import shutil
 import signal
 import subprocess
 import sys
 import tempfile
+import threading
 
 STORAGE = "/var/db/timezone/"
 ZONEINFO, ICUTZ, LOCALTIME, LATEST, RECORD = (
@@ -21,7 +22,7 @@ OLD_ICUTZ, OLD_ICU = "/var/db/icutz", "/var/db/icu"
 OWN = {ZONEINFO, ICUTZ, LOCALTIME, RECORD, OLD_ICUTZ, OLD_ICU}
 SYSTEM_TREE = "/usr/share/zoneinfo.default"
 OLDER_DOWNLOAD, DOWNLOAD = STORAGE + "tz/2016b.2.0", STORAGE + "tz/2016c.1.0"
-DEFAULT_ZONE = ZONEINFO + "/America/Los_Angeles"
+ON_SYSTEM, ON_DOWNLOAD = "-> " + SYSTEM_TREE, f"-> {DOWNLOAD}/zoneinfo"
 ABSENT = "(absent)"
 
 ERRORS = ("EIO", "EACCES", "ENOSPC", "EROFS", "ENOMEM", "EMFILE", "EINTR")
@@ -35,12 +36,8 @@ WARNING = re.compile("olmboot: .+: (%s)" % "|".join(
     re.escape(text) for text in {os.strerror(number) for number in range(134)}))
 
 
-def link(target):
-    return "-> " + target
-
-
 def active(data_set):
-    return {ZONEINFO: link(data_set + "/zoneinfo"), ICUTZ: link(data_set + "/icutz")}
+    return {ZONEINFO: f"-> {data_set}/zoneinfo", ICUTZ: f"-> {data_set}/icutz"}
 
 
 COMMON = {
@@ -54,19 +51,19 @@ COMMON = {
     DOWNLOAD + "/icutz/icutz44l.dat": "data",
     OLDER_DOWNLOAD + "/zoneinfo/Europe/Paris": "zone",
     OLDER_DOWNLOAD + "/icutz/icutz44l.dat": "data",
-    LATEST: link(DOWNLOAD),
-    LOCALTIME: link(ZONEINFO + "/Europe/Paris"),
+    LATEST: "-> " + DOWNLOAD,
+    LOCALTIME: f"-> {ZONEINFO}/Europe/Paris",
 }
 UPDATED = {**COMMON, **active(DOWNLOAD), RECORD: "2016b.1.0_2016c.1.0"}
 BOOTS = {
     "new device": {path: what for path, what in COMMON.items()
                    if not path.startswith(STORAGE)} | {STORAGE + "tz/none": ""},
-    "update": {**COMMON, ZONEINFO: link(SYSTEM_TREE)},
+    "update": {**COMMON, ZONEINFO: ON_SYSTEM},
     "newer download": {**COMMON, **active(OLDER_DOWNLOAD), RECORD: "2016b.1.0_2016b.2.0"},
     "nothing new": UPDATED,
     "system upgrade": {**UPDATED, SYSTEM_TREE + "/+VERSION": "2016d\n"},
-    "older entries": {**UPDATED, ICUTZ: ABSENT, OLD_ICUTZ: link(DOWNLOAD + "/icutz"), OLD_ICU: "",
-                      LOCALTIME: link("/usr/share/zoneinfo/Europe/Paris")},
+    "older entries": {**UPDATED, ICUTZ: ABSENT, OLD_ICUTZ: f"-> {DOWNLOAD}/icutz", OLD_ICU: "",
+                      LOCALTIME: "-> /usr/share/zoneinfo/Europe/Paris"},
 }
 
 
@@ -77,7 +74,7 @@ class Device:
         self.root = tempfile.mkdtemp()
         os.mkdir(self.root + "/sbin")
         shutil.copy(os.environ["OLMBOOT_PROGRAM"], self.root + "/sbin/olmboot")
-        self.trace = self.root + "/trace"
+        self.trace_file = self.root + "/trace"
 
     def put(self, entries):
         for top in ("/usr", "/var"):
@@ -96,10 +93,9 @@ class Device:
         found = {}
         for top in ("/usr", "/var"):
             for directory, names, files in os.walk(self.root + top):
-                for name in names + files:
-                    path = os.path.join(directory, name)
+                for path in (os.path.join(directory, name) for name in names + files):
                     if os.path.islink(path):
-                        what = link(os.readlink(path))
+                        what = "-> " + os.readlink(path)
                     elif os.path.isdir(path):
                         what = "(directory)"
                     else:
@@ -110,16 +106,54 @@ class Device:
 
     def boot(self, *injection):
         """Runs the program. Returns its status, a signal's negated, and the lines that it printed;
-        one on standard output says so."""
+        one on standard output says so. Ends it at the time limit, with the status None."""
         command = ["setarch", "-R", "chroot", self.root, "/sbin/olmboot"]
         if injection:
-            command = ["strace", "-o", self.trace, *injection, *command]
-        run = subprocess.run(command, capture_output=True, check=False, timeout=TIME_LIMIT)
+            command = ["strace", "-o", self.trace_file, *injection, *command]
+        with subprocess.Popen(command, stdout=subprocess.PIPE, stderr=subprocess.PIPE,
+                              start_new_session=True) as run:
+            try:
+                output, lines = run.communicate(timeout=TIME_LIMIT)
+            except subprocess.TimeoutExpired:
+                os.killpg(run.pid, signal.SIGKILL)  # strace and the program
+                return None, []
         # strace has a word to say about an address that 32 bits don't hold.
-        lines = [line for line in run.stderr.decode().splitlines()
-                 if not line.startswith("strace: ")]
-        return run.returncode, lines + [
-            "on standard output: " + line for line in run.stdout.decode().splitlines()]
+        return run.returncode, [
+            line for line in lines.decode().splitlines() if not line.startswith("strace: ")
+        ] + ["on standard output: " + line for line in output.decode().splitlines()]
+
+    def trace(self):
+        with open(self.trace_file, encoding="utf-8") as file:
+            return file.read().splitlines()
+
+
+Call = collections.namedtuple("Call", "name line injection")  # injection: of a fault, by its name
+
+
+def calls_of(device, start):
+    """The calls that the program makes on the device after the C library's start."""
+    device.put(start)
+    device.boot("-e", "trace=all")
+    calls, seen, old_end, early = [], collections.Counter(), "0", []
+    for line in device.trace():
+        name = line.split("(")[0]
+        seen[name] += 1
+        # What prepare_process() calls first.
+        if calls or line.startswith("rt_sigaction(SIGPIPE"):
+            inject = f"inject={name}:{{}}:when={seen[name]}"
+            faults = {error: inject.format("error=" + error)
+                      for error in POSSIBLE.get(name, ERRORS)}
+            if name == "brk":
+                faults["ENOMEM"] = inject.format("retval=" + old_end)  # that is how it fails
+            faults["kill"] = inject.format("signal=SIGKILL")
+            calls.append(Call(name, line, faults))
+        else:
+            early = [] if name == "execve" else early + re.findall('"/(?:usr|var)/[^"]*"', line)
+        if name == "brk":
+            old_end = line.split("= ")[-1]
+    if early or not calls:
+        sys.exit(f"faults: a run must begin with SIGPIPE, but strace shows {early or 'no run'}")
+    return calls[:-1]  # without the line that tells the status
 
 
 def resolves(state, path):
@@ -135,257 +169,176 @@ def resolves(state, path):
     return False
 
 
-class Call:
-    """A system call of a run: its name, which of that name it is in the trace, and its line."""
+def caveat(run, path, was, found):
+    """Returns the case under CAVEATS in olmboot(8) which explains that the boot after a run leaves
+    `found` at a path where `was` stood before the fault; None if there is none."""
+    def at(*paths):
+        return any(f'"{name}"' in run.call.line for name in paths)
 
-    def __init__(self, name, nth, line, old_end):
-        self.name, self.nth, self.line, self.old_end = name, nth, line, old_end
-
-    @property
-    def writes_line(self):
-        return self.line.startswith("write(2,")
-
-    @property
-    def writes_record(self):
-        return self.name == "ftruncate" or self.name == "write" and "_" in self.line
-
-    def errors(self):
-        return POSSIBLE.get(self.name, ERRORS)
-
-    def injection(self, fault):
-        if fault == "kill":
-            what = "signal=SIGKILL"
-        elif self.name == "brk":
-            what = "retval=" + self.old_end  # that is how this call fails
-        else:
-            what = "error=" + fault
-        return "-e", f"trace={self.name}", "-e", f"inject={self.name}:{what}:when={self.nth}"
-
-
-def calls_of(device, start):
-    """The calls that the program makes on the device after the C library's start."""
-    device.put(start)
-    device.boot("-e", "trace=all")
-    calls, seen, old_end, started = [], {}, "0", False
-    with open(device.trace, encoding="utf-8") as trace:
-        for line in trace:
-            name = line.split("(")[0]
-            if line.startswith("+++"):
-                break
-            seen[name] = seen.get(name, 0) + 1
-            # What prepare_process() calls first.
-            started = started or line.startswith("rt_sigaction(SIGPIPE")
-            if started:
-                calls.append(Call(name, seen[name], line.strip(), old_end))
-            if name == "brk":
-                old_end = line.split("= ")[-1].strip()
-    if not calls:
-        sys.exit("faults: the trace doesn't show where the program starts")
-    return calls
+    killed = run.fault == "kill"
+    on_download = run.left.get(ZONEINFO) == ON_DOWNLOAD
+    if path == RECORD and found == UPDATED[RECORD]:
+        return "record names the system"
+    if path == RECORD and found in (was, "") and on_download and (
+            killed or at(RECORD) or run.call.name in ("ftruncate", "fstat", "newfstatat")
+            or run.call.name == "write" and "_" in run.call.line):
+        return "record not written"
+    if path == ICUTZ and found in (was, ABSENT) and on_download and killed:
+        return "ICU link missing or old"
+    if (path == ICUTZ and found == was == ABSENT and not killed and OLD_ICUTZ not in run.left
+            and at(OLD_ICUTZ, ICUTZ)):
+        return "old ICU link lost"
+    if (path == ICUTZ and found == was != ABSENT and run.left.get(ZONEINFO) == ON_SYSTEM
+            and (killed or at(ICUTZ))):
+        return "ICU link left over"
+    if path == LOCALTIME and found == f"-> {ZONEINFO}/America/Los_Angeles" and (
+            LOCALTIME not in run.left if killed
+            else at(LOCALTIME) or ZONEINFO + "/" in run.call.line):
+        return "zone lost"
+    return None
 
 
-class History:
-    """A device, what an undisturbed boot leaves of it, and what a second one does."""
+class Run:
+    """One fault of a boot: what the run left, what the next boot did, and what was wrong."""
 
-    def __init__(self, device, start):
-        self.start = start
-        device.put(start)
+    def __init__(self, device, boot, call, fault):
+        self.boot, self.call, self.fault = boot, call, fault
+        self.exceptions, self.violations = [], []
+        device.put(boot.start)
+        self.status, self.lines = device.boot(
+            "-e", f"trace={call.name}", "-e", call.injection[fault])
+        self.struck = any("INJECTED" in line for line in device.trace())
+        self.left = device.look()
+        self.next_status, _ = device.boot()
+        self.after = device.look()
+        self.check_end()
+        self.check_links()
+        self.check_next_boot()
+
+    def check_end(self):
+        if self.fault == "kill":
+            if self.status != -signal.SIGKILL:
+                self.violations.append(f"not killed, but status {self.status}")
+            return
+        if not self.struck:
+            self.violations.append("the fault did not strike")
+        if not self.call.line.startswith("write(2,"):
+            self.violations += [f"this line is not a warning: {line}" for line in self.lines
+                                if not WARNING.fullmatch(line)]
+        if self.status is None:
+            self.violations.append(f"no end after {TIME_LIMIT} s")
+        elif self.status == 1 and re.match(f'symlink.*"{LOCALTIME}"', self.call.line):
+            self.exceptions.append("status 1")
+        elif self.status != 0:
+            self.violations.append(f"status {self.status}")
+        elif not (resolves(self.left, ZONEINFO)
+                  and self.left.get(LOCALTIME, "").startswith("-> " + ZONEINFO)):
+            self.violations.append("links that can't be used")
+
+    def check_links(self):
+        before = self.boot.before
+        self.violations += [f"{path} has changed" for path in before.keys() | self.left.keys()
+                            if path not in OWN and before.get(path) != self.left.get(path)]
+        installed = {path: self.left.get(path) for path in (ZONEINFO, ICUTZ)}
+        if self.left.get(RECORD) != before.get(RECORD) and installed != active(DOWNLOAD):
+            self.violations.append("a record of an update that is not installed")
+
+    def check_next_boot(self):
+        if self.next_status != 0:
+            self.violations.append(f"the next boot has status {self.next_status}")
+        expected = self.boot.after
+        for path in sorted(expected.keys() | self.after.keys()):
+            found = self.after.get(path, ABSENT)
+            if found == expected.get(path, ABSENT):
+                continue
+            name = caveat(self, path, self.boot.before.get(path, ABSENT), found)
+            if name:
+                self.exceptions.append(name)
+            else:
+                self.violations.append(f"the next boot leaves {path} {found!r}")
+
+    def show(self):
+        print(self.call.line)
+        print(f"fault: {self.fault}; status: {self.status}")
+        for line in self.lines:
+            print("printed:", line)
+        for title, earlier, later in (("changed", self.boot.before, self.left),
+                                      ("the next boot changed", self.left, self.after)):
+            for path in sorted(earlier.keys() | later.keys()):
+                if earlier.get(path) != later.get(path):
+                    print(f"{title}: {path} {later.get(path, ABSENT)}")
+        for name in self.exceptions:
+            print("exception:", name)
+        for violation in self.violations:
+            print("violation:", violation)
+
+
+class Boot:
+    """A boot of the device `start`: its calls, and what one and two undisturbed runs leave."""
+
+    def __init__(self, device, name):
+        self.name, self.start = name, BOOTS[name]
+        self.calls = calls_of(device, self.start)
+        device.put(self.start)
         self.before = device.look()
         device.boot()
-        self.middle = device.look()
         device.boot()
         self.after = device.look()
 
 
-class Outcome:
-    """What one fault led to: what the run left, and what the next boot did."""
-
-    def __init__(self, call, fault):
-        self.call, self.fault, self.killed = call, fault, fault == "kill"
-        self.status, self.lines, self.left = None, [], {}
-        self.next_status, self.after = None, {}
-        self.exceptions, self.violations = [], []
-
-    def names(self, path):
-        return f'"{path}"' in self.call.line
-
-
-# The exceptions that olmboot(8) names under CAVEATS: each says whether it explains that the next
-# boot leaves `found` at a path. `was` is what stood there before the fault.
-
-def record_not_written(outcome, path, was, found):
-    return (path == RECORD and found in (was, "")
-            and outcome.left.get(ZONEINFO) == link(DOWNLOAD + "/zoneinfo")
-            and (outcome.killed or outcome.names(RECORD) or outcome.call.writes_record))
-
-
-def record_names_system(_outcome, path, _was, found):
-    return path == RECORD and found == UPDATED[RECORD]
-
-
-def icu_link_not_new(outcome, path, was, found):
-    return (path == ICUTZ and found in (was, ABSENT) and outcome.killed
-            and outcome.left.get(ZONEINFO) == link(DOWNLOAD + "/zoneinfo"))
-
-
-def old_icu_link_lost(outcome, path, was, found):
-    return (path == ICUTZ and found == was == ABSENT and not outcome.killed
-            and OLD_ICUTZ not in outcome.left
-            and (outcome.names(OLD_ICUTZ) or outcome.names(ICUTZ)))
-
-
-def icu_link_left_over(outcome, path, was, found):
-    return (path == ICUTZ and found == was != ABSENT
-            and outcome.left.get(ZONEINFO) == link(SYSTEM_TREE)
-            and (outcome.killed or outcome.names(ICUTZ)))
-
-
-def zone_lost(outcome, path, _, found):
-    return (path == LOCALTIME and found == link(DEFAULT_ZONE)
-            and (LOCALTIME not in outcome.left if outcome.killed
-                 else outcome.names(LOCALTIME) or ZONEINFO + "/" in outcome.call.line))
-
-
-RULES = (record_not_written, record_names_system, icu_link_not_new, old_icu_link_lost,
-         icu_link_left_over, zone_lost)
-
-
-def ended_early(outcome):
-    """The one early end that a single fault leads to: the default local time link can't be made."""
-    return outcome.status == 1 and outcome.call.name == "symlink" and outcome.names(LOCALTIME)
-
-
-def make_fault(device, history, call, fault):
-    """Makes one fault happen on the device and returns its Outcome."""
-    outcome = Outcome(call, fault)
-    device.put(history.start)
-    try:
-        outcome.status, outcome.lines = device.boot(*call.injection(fault))
-        outcome.left = device.look()
-        outcome.next_status, _ = device.boot()
-    except subprocess.TimeoutExpired:
-        outcome.violations.append(f"no end after {TIME_LIMIT} s")
-        return outcome
-    outcome.after = device.look()
-    check(device, history, outcome)
-    return outcome
-
-
-def check(device, history, outcome):
-    """Fills in the outcome's exceptions and violations."""
-    left, violations = outcome.left, outcome.violations
-    if outcome.killed:
-        if outcome.status != -signal.SIGKILL:
-            violations.append(f"not killed, but status {outcome.status}")
-    else:
-        with open(device.trace, encoding="utf-8") as trace:
-            if "INJECTED" not in trace.read():
-                violations.append("the fault did not strike")
-        if ended_early(outcome):
-            outcome.exceptions.append("ended early")
-        elif outcome.status != 0:
-            violations.append(f"status {outcome.status}")
-        elif not (resolves(left, ZONEINFO)
-                  and left.get(LOCALTIME, "").startswith(link(ZONEINFO))):
-            violations.append("links that can't be used")
-    if not outcome.killed and not outcome.call.writes_line:
-        violations += [f"this line is not a warning: {line}" for line in outcome.lines
-                       if not WARNING.fullmatch(line)]
-    for path in sorted(left.keys() | history.before.keys()):
-        if left.get(path) != history.before.get(path) and path not in OWN:
-            violations.append(f"{path} has changed")
-    if left.get(RECORD) != history.before.get(RECORD) and {
-            ZONEINFO: left.get(ZONEINFO), ICUTZ: left.get(ICUTZ)} != active(DOWNLOAD):
-        violations.append("a record of an update that is not installed")
-    if outcome.next_status != 0:
-        violations.append(f"the next boot has status {outcome.next_status}")
-    for path in sorted(history.after.keys() | outcome.after.keys()):
-        expected = history.after.get(path, ABSENT)
-        found = outcome.after.get(path, ABSENT)
-        if expected == found:
-            continue
-        was = history.before.get(path, ABSENT)
-        allowed = [rule.__name__.replace("_", " ") for rule in RULES
-                   if rule(outcome, path, was, found)]
-        if allowed:
-            outcome.exceptions += allowed
-        else:
-            violations.append(f"the next boot leaves {path} {found!r} instead of {expected!r}")
-
-
-def show(outcome, history):
-    """Shows one fault to a person."""
-    print(outcome.call.line)
-    print(f"fault: {outcome.fault}; status: {outcome.status}")
-    for line in outcome.lines:
-        print("printed:", line)
-    for title, earlier, later in (("changed", history.before, outcome.left),
-                                  ("the next boot changed", outcome.left, outcome.after)):
-        for path in sorted(earlier.keys() | later.keys()):
-            if earlier.get(path) != later.get(path):
-                print(f"{title}: {path} {later.get(path, ABSENT)}")
-    for name in outcome.exceptions:
-        print("exception:", name)
-    for violation in outcome.violations:
-        print("violation:", violation)
-
-
-def run_boot(name, devices):
+def make_every_fault(name):
     """Makes every fault of one boot happen, prints its row, and returns its violations."""
-    free = queue.SimpleQueue()
-    for device in devices:
-        free.put(device)
-    history = History(devices[0], BOOTS[name])
-    calls = calls_of(devices[0], BOOTS[name])
-    faults = [(n, call, fault) for n, call in enumerate(calls, 1)
-              for fault in (*call.errors(), "kill")]
+    worker = threading.local()
 
-    def work(numbered):
-        n, call, fault = numbered
-        device = free.get()
-        try:
-            return n, make_fault(device, history, call, fault)
-        finally:
-            free.put(device)
+    def start_worker():
+        worker.device = Device()
 
-    exceptions, violations = collections.Counter(), []
-    with concurrent.futures.ThreadPoolExecutor(len(devices)) as workers:
-        for done, (n, outcome) in enumerate(workers.map(work, faults), 1):
-            exceptions.update(outcome.exceptions)
-            violations += [(n, outcome.fault, violation) for violation in outcome.violations]
-            if sys.stderr.isatty():
-                print(f"\r{name}: {done} of {len(faults)}\033[K", end="\r", file=sys.stderr)
-    kills = len(calls)
+    boot = Boot(Device(), name)
+    faults = [(n, fault) for n, call in enumerate(boot.calls) for fault in call.injection]
+    with multiprocessing.pool.ThreadPool(os.cpu_count(), start_worker) as pool:
+        runs = pool.map(lambda at: Run(worker.device, boot, boot.calls[at[0]], at[1]), faults)
+    exceptions = collections.Counter(itertools.chain(*(run.exceptions for run in runs)))
+    violations = [
+        f"{violation}; see it: tools/faults --boot '{name}' --call {n + 1} --fault {fault}"
+        for (n, fault), run in zip(faults, runs) for violation in run.violations]
     row = ", ".join(f"{exception} {count}" for exception, count in sorted(exceptions.items()))
-    print(f"{name:15} {len(calls):5} {len(faults) - kills:6} {kills:5} {len(violations):10}  {row}",
-          flush=True)
-    return [f"{violation}; see it: tools/faults --boot '{name}' --call {n} --fault {fault}"
-            for n, fault, violation in violations]
+    print(f"{name:15} {len(boot.calls):5} {len(faults) - len(boot.calls):6} {len(boot.calls):5} "
+          f"{len(violations):10}  {row}", flush=True)
+    return violations
 
 
 def main():
-    parser = argparse.ArgumentParser()
+    parser = argparse.ArgumentParser(prog="faults", usage=argparse.SUPPRESS, add_help=False)
     parser.add_argument("--boot", choices=BOOTS)
     parser.add_argument("--call", type=int)
     parser.add_argument("--fault", choices=(*ERRORS, "kill"))
     options = parser.parse_args()
-    if options.boot and options.call and options.fault:
+    if (options.call is None) != (options.fault is None) or options.fault and not options.boot:
+        parser.error("--call and --fault go together, with --boot")
+    if options.call is not None:
         device = Device()
-        history = History(device, BOOTS[options.boot])
-        call = calls_of(device, BOOTS[options.boot])[options.call - 1]
-        outcome = make_fault(device, history, call, options.fault)
-        show(outcome, history)
-        return 1 if outcome.violations else 0
+        boot = Boot(device, options.boot)
+        if not 1 <= options.call <= len(boot.calls):
+            parser.error(f"the boot has the calls 1 to {len(boot.calls)}")
+        call = boot.calls[options.call - 1]
+        if options.fault not in call.injection:
+            parser.error(f"this call has the faults {', '.join(call.injection)}: {call.line}")
+        run = Run(device, boot, call, options.fault)
+        run.show()
+        return 1 if run.violations else 0
     print("boot            calls faults kills violations  exceptions")
-    devices = [Device() for _ in range(os.cpu_count() or 1)]
     violations = []
     for name in [options.boot] if options.boot else BOOTS:
-        violations += run_boot(name, devices)
+        violations += make_every_fault(name)
     for violation in violations:
         print(violation)
+    print("olmboot(8) explains the exceptions: status 1 under EXIT STATUS, others under CAVEATS.")
     print(f"{len(violations)} violations")
     return 1 if violations else 0
 
 
 if __name__ == "__main__":
-    sys.exit(main())
+    try:
+        sys.exit(main())
+    except KeyboardInterrupt:
+        os._exit(130)
