@@ -33,7 +33,8 @@ class olm_dataset {
   // Prints and throws what the components do; an error leaves the later links as they were.
   void install_links() const;
 
-  // Returns the version string as it stands on disk.
+  // Returns the version string, in the grammar or not: of a download, the rest of its path; of the
+  // system data set, the first word of its version file and ".1.0".
   std::string version_string() const;
 
   // Returns whether both are at the same path.

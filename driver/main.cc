@@ -4,8 +4,8 @@
 #include "driver/selection.h"
 #include "driver/storage.h"
 
-// One run. Each step reports its own failures and the next one runs all the same. An exception that
-// escapes a step ends the run with status 1.
+// One run. A step that fails doesn't keep the next one from running, unless an exception escapes
+// it: that ends the run with status 1.
 int main() {
   prepare_process();
   prepare_storage();

@@ -2,10 +2,10 @@
 
 #include <regex>
 
-// The standard library's traits without its questions to the locale. While it compiles a set, the
-// library asks for every character whether it is in a class and what it is equivalent to. Without
-// the answers a run takes 0.1 ms less, a ninth of it. So a pattern must do without classes. A named
-// one such as [[:alpha:]] is refused; \d, \w, \s and \b compile and match wrongly.
+// The standard library's traits, but without classes of characters. While it compiles a set, the
+// library asks the locale of every character which classes it is in and which others it equals.
+// Answering for the locale makes a run 0.1 ms shorter, by a ninth. So a pattern must do without
+// classes: [[:alpha:]], \d, \w and \s are refused, and \b compiles but matches wrongly.
 struct olm_pattern_traits : std::regex_traits<char> {
   template <typename iterator>
   static char_class_type lookup_classname(iterator /*first*/, iterator /*last*/,

@@ -13,9 +13,9 @@ inline constexpr filesystem_error no_error_number = -1;
 // may have changed. So the line that the catcher prints ends in the same cause.
 [[noreturn]] void throw_filesystem_error(filesystem_error error);
 
-// The filesystem operations of the program. Each is one system call on an absolute path. When it
-// fails, it prints one line that ends in the call's error, and throws that as filesystem_error.
-// Nothing is retried and nothing is undone.
+// The filesystem operations whose failures are reported alike. Each is one system call on an
+// absolute path. When it fails, it prints one line that ends in the call's error, and throws that
+// as filesystem_error. Nothing is retried and nothing is undone.
 //
 // Always called with the namespace written out, as the C library's remove always is with std::.
 namespace primitive {
