@@ -59,6 +59,7 @@ class device : public ::testing::Test {
       err(EXIT_FAILURE, "be root, or allow user namespaces: chroot to %s", root.c_str());
     }
     planned_fault = {};
+    std::memset(printed, 0, printed_size);
   }
   ~device() override {
     if (fchdir(machine) != 0 || chroot(".") != 0) std::abort();

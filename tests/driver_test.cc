@@ -103,12 +103,12 @@ const boot_case cases[] = {
      "~/tz_latest -> ~/tz/2016c/\n~/localtime -> /usr/share/zoneinfo/Asia/Tokyo/None\n",
      unparsed("2016c/") + refused("2016c/", "2016b.1.0") +
          correcting("~/zoneinfo/Asia/Tokyo/None") + zone_reset + default_zone},
-    {"no_version_and_dangling_old_ICU_link_and_zone_link_to_the_system_tree",
-     version + "\n/var/db/icutz -> /none\n~/localtime -> /usr/share/zoneinfo.default/Asia/Tokyo\n",
+    {"no_version_and_old_ICU_link_to_itself_and_zone_link_to_the_system_tree",
+     version + "\n/var/db/icutz -> icutz\n~/localtime -> /usr/share/zoneinfo.default/Asia/Tokyo\n",
      unparsed(".1.0") + unparsed(".1.0") + correcting("~/zoneinfo.default/Asia/Tokyo") +
          zone_reset + default_zone},  // no data set is made for an absent latest link
-    {"bad_zoneinfo_link_and_old_ICU_link_to_itself",
-     "~/zoneinfo -> /%s%n\n/var/db/icutz -> icutz\n" + newest_2016c,
+    {"bad_zoneinfo_link_and_dangling_old_ICU_link",
+     "~/zoneinfo -> /%s%n\n/var/db/icutz -> /none\n" + newest_2016c,
      bad_link("/%s%n") + invalid + "/var/db/icutz (absent)\n" + updated},
     {"bad_version_and_latest_link_and_dangling_ICU_link",
      version + "%s%n\n~/icutz -> /none\n~/tz_latest -> ~/tz-%s%n\n~/zoneinfo -> ~/tz/2016e/\n",

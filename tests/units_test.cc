@@ -31,7 +31,7 @@ TEST_F(units_test, versions_are_strictly_ordered) {
 
 TEST_F(units_test, near_misses_are_no_versions) {
   for (const string text : {"2016", "a", "2016A", "2016z.", "2016a..1", "2016a.1.2.3", "2016a-1",
-                            "2016a.1.0/", " 2016a", "-2016a", "\xEF\xBB\xBF 2016a"}) {
+                            "2016a.1.0/", " 2016a", "-2016a"}) {
     olm_version version("2016a.1.0");
     version.parse(text);
     EXPECT_EQ(version, olm_version()) << text;
@@ -77,8 +77,8 @@ TEST_F(units_test, a_word_ends_at_white_space_and_its_file_somewhere) {
   put("/link -> file\n/pipe (pipe)\n/large = word other\n/long = " + string(9000, 'x') + "\n");
   EXPECT_EQ(read_first_word("/pipe"), "");
   for (const char blank : {' ', '\t', '\v', '\f', '\r'}) {
-    put(string("/file = ") + blank + "word" + blank + "other\n");
-    EXPECT_EQ(read_first_word("/link"), "word") << static_cast<int>(blank);
+    put(string("/file = ") + blank + "\xEF\xBB\xBFword" + blank + "other\n");
+    EXPECT_EQ(read_first_word("/link"), "\xEF\xBB\xBFword") << static_cast<int>(blank);
   }
   ASSERT_EQ(truncate("/large", 16 << 20), 0);
   EXPECT_EQ(read_first_word("/large"), "word");
