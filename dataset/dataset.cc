@@ -8,6 +8,7 @@
 
 #include "dataset/icu.h"
 #include "dataset/zoneinfo.h"
+#include "util/paths.h"
 #include "util/starts_with.h"
 
 namespace {
@@ -20,7 +21,7 @@ constexpr char system_version_suffix[] = ".1.0";
 olm_dataset::olm_dataset(const std::string& directory) : path(directory) { create_components(); }
 
 void olm_dataset::create_components() {
-  constexpr std::string_view root = downloads_root;
+  constexpr std::string_view root = paths::downloads;
   const auto zoneinfo = std::make_shared<const olm_zoneinfo>(path);
   if (path.empty()) {
     version_text = zoneinfo->get_file_version() + system_version_suffix;

@@ -12,13 +12,10 @@
 // Destroying it changes nothing on disk.
 class olm_dataset {
  public:
-  // What the path of every download begins with; the rest of the path is its version string.
-  static constexpr char downloads_root[] = "/var/db/timezone/tz/";
-
   // The download at `directory`; the system data set if that is empty. A version string outside the
   // grammar gives the unknown version.
   // Prints and throws what olm_version::parse and the components do. For a directory that is not
-  // below downloads_root, prints "olm_dataset::create_components: bad path DIRECTORY" and throws
+  // below paths::downloads, prints "olm_dataset::create_components: bad path DIRECTORY" and throws
   // std::invalid_argument.
   explicit olm_dataset(const std::string& directory = {});
 

@@ -10,14 +10,13 @@
 #include <regex>
 
 #include "util/first_word.h"
+#include "util/paths.h"
 #include "util/pattern.h"
 #include "util/primitives.h"
 
 namespace {
 
-// The system data set's directory. Never written, and no link leads to it.
-constexpr char system_directory[] = "/usr/share/icu";
-// The file in it whose first word is the system's schema.
+// The file in the system's directory whose first word is the system's schema.
 constexpr char schema_file[] = "icutzformat.txt";
 // The directory's name in a download's directory.
 constexpr char subdirectory[] = "icutz";
@@ -53,7 +52,7 @@ bool is_public_file_at_top(const FTSENT& entry) {
 
 olm_icu::olm_icu(const std::string& path)
     : olm_dataset_component(path),
-      directory(path.empty() ? system_directory : path + "/" + subdirectory) {
+      directory(path.empty() ? paths::system_icu : path + "/" + subdirectory) {
   initialize();
 }
 
@@ -91,10 +90,10 @@ bool olm_icu::compatible_schema(const olm_dataset_component& other) const {
 
 void olm_icu::install_link() const {
   try {
-    primitive::remove(link_path);
-    primitive::remove(legacy_link_path);
+    primitive::remove(paths::icu_link);
+    primitive::remove(paths::legacy_icu_link);
   } catch (...) {
     warn("unlink of ICU softlink failed");
   }
-  if (!dataset_path.empty()) primitive::create_symlink(directory, link_path);
+  if (!dataset_path.empty()) primitive::create_symlink(directory, paths::icu_link);
 }

@@ -9,11 +9,6 @@
 // compared as text.
 class olm_icu final : public olm_dataset_component {
  public:
-  // The link to the active download's directory; absent while the system data set is active.
-  static constexpr char link_path[] = "/var/db/timezone/icutz";
-  // Where that link was on older systems.
-  static constexpr char legacy_link_path[] = "/var/db/icutz";
-
   // The files of the data set at `path`; the system data set's if that is empty. The schema stays
   // empty when none is found.
   // If a download has no schema, prints "No ICU schema found for PATH". If the walk of its

@@ -3,6 +3,7 @@
 #include <err.h>
 
 #include "util/first_word.h"
+#include "util/paths.h"
 #include "util/primitives.h"
 
 namespace {
@@ -16,7 +17,7 @@ constexpr char version_file[] = "+VERSION";
 
 olm_zoneinfo::olm_zoneinfo(const std::string& path)
     : olm_dataset_component(path),
-      directory(path.empty() ? system_directory : path + "/" + subdirectory) {
+      directory(path.empty() ? paths::system_zoneinfo : path + "/" + subdirectory) {
   initialize();
 }
 
@@ -28,10 +29,10 @@ bool olm_zoneinfo::compatible_schema(const olm_dataset_component& /*other*/) con
 
 void olm_zoneinfo::install_link() const {
   try {
-    primitive::remove(link_path);
+    primitive::remove(paths::zoneinfo_link);
   } catch (...) {
     // A capital here and none in the ICU component's message: both are searched for as they are.
     warn("Unlink of zoneinfo softlink failed");
   }
-  primitive::create_symlink(directory, link_path);
+  primitive::create_symlink(directory, paths::zoneinfo_link);
 }

@@ -7,11 +7,6 @@
 // The compiled tz database tree of one data set.
 class olm_zoneinfo final : public olm_dataset_component {
  public:
-  // The system data set's tree. Never written.
-  static constexpr char system_directory[] = "/usr/share/zoneinfo.default";
-  // The link to the active tree.
-  static constexpr char link_path[] = "/var/db/timezone/zoneinfo";
-
   // The tree of the data set at `path`; the system data set's if that is empty. The tree need not
   // exist. Prints nothing. Throws only std::bad_alloc.
   explicit olm_zoneinfo(const std::string& path = {});

@@ -4,13 +4,12 @@
 
 #include <cstdio>
 
-#include "dataset/icu.h"
-#include "driver/paths.h"
+#include "util/paths.h"
 #include "util/primitives.h"
 
 void migrate_legacy_icu_link() {
-  constexpr const char* old_link = olm_icu::legacy_link_path;
-  constexpr const char* new_link = olm_icu::link_path;
+  constexpr const char* old_link = paths::legacy_icu_link;
+  constexpr const char* new_link = paths::icu_link;
   if (primitive::exists(old_link) && !primitive::exists(new_link)) {
     try {
       primitive::create_symlink(primitive::read_symlink(old_link), new_link);

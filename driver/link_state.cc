@@ -4,21 +4,19 @@
 
 #include <string_view>
 
-#include "dataset/dataset.h"
-#include "dataset/zoneinfo.h"
-#include "driver/paths.h"
+#include "util/paths.h"
 #include "util/primitives.h"
 #include "util/starts_with.h"
 
 std::string read_latest_path() { return primitive::read_symlink(paths::latest_link); }
 
 std::string parse_zoneinfo_link(const std::string& link) {
-  constexpr std::string_view root = olm_dataset::downloads_root;
+  constexpr std::string_view root = paths::downloads;
   if (starts_with(link, root)) {
     // At least one character must stand between the root's own slash and the last one.
     const std::size_t last_slash = link.rfind('/');
     if (last_slash > root.size()) return link.substr(0, last_slash);
-  } else if (link == olm_zoneinfo::system_directory) {
+  } else if (link == paths::system_zoneinfo) {
     return {};
   }
   warn("Bad zoneinfo link %s", link.c_str());
@@ -26,5 +24,5 @@ std::string parse_zoneinfo_link(const std::string& link) {
 }
 
 std::string read_current_path() {
-  return parse_zoneinfo_link(primitive::read_symlink(olm_zoneinfo::link_path));
+  return parse_zoneinfo_link(primitive::read_symlink(paths::zoneinfo_link));
 }

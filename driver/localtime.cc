@@ -6,8 +6,7 @@
 #include <string>
 #include <string_view>
 
-#include "dataset/zoneinfo.h"
-#include "driver/paths.h"
+#include "util/paths.h"
 #include "util/primitives.h"
 #include "util/starts_with.h"
 
@@ -26,9 +25,9 @@ bool keep_or_correct() {
   constexpr std::string_view old_prefix = paths::legacy_zoneinfo_prefix;
   try {
     std::string target = primitive::read_symlink(paths::localtime_link);
-    if (starts_with(target, olm_zoneinfo::link_path)) return true;
+    if (starts_with(target, paths::zoneinfo_link)) return true;
     if (!starts_with(target, old_prefix)) return false;
-    target.replace(0, old_prefix.size(), olm_zoneinfo::link_path);
+    target.replace(0, old_prefix.size(), paths::zoneinfo_link);
     warn("Correcting localtime link to %s", target.c_str());
     if (!primitive::exists(target)) return false;
     replace_link(target);
@@ -43,5 +42,5 @@ bool keep_or_correct() {
 void repair_localtime_link() {
   if (keep_or_correct()) return;
   warn("localtime link invalid; resetting to %s", default_zone);
-  replace_link(std::string(olm_zoneinfo::link_path) + "/" + default_zone);
+  replace_link(std::string(paths::zoneinfo_link) + "/" + default_zone);
 }

@@ -9,7 +9,7 @@
 
 #include "dataset/dataset.h"
 #include "driver/link_state.h"
-#include "driver/paths.h"
+#include "util/paths.h"
 
 namespace {
 

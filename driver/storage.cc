@@ -3,9 +3,8 @@
 #include <fcntl.h>
 #include <unistd.h>
 
-#include "dataset/dataset.h"
-#include "driver/paths.h"
 #include "platform/protection_class.h"
+#include "util/paths.h"
 
 namespace {
 
@@ -20,5 +19,5 @@ void set_protection_class(const char* path) noexcept {
 
 void prepare_storage() noexcept {
   set_protection_class(paths::storage);
-  set_protection_class(olm_dataset::downloads_root);
+  set_protection_class(paths::downloads);
 }
