@@ -30,8 +30,8 @@ inline constexpr char record[] = "/var/db/timezone/TZVersionDiffRecord";
 inline constexpr char system_zoneinfo[] = "/usr/share/zoneinfo.default";
 inline constexpr char system_icu[] = "/usr/share/icu";
 
-// What older systems left: where the ICU link was; an ICU entry, which is removed; and what the text
-// of a local time link began with, which is rewritten.
+// What older systems left: where the ICU link was; an ICU entry, which is removed; and what the
+// text of a local time link began with, which is rewritten.
 inline constexpr char legacy_icu_link[] = "/var/db/icutz";
 inline constexpr char legacy_icu_entry[] = "/var/db/icu";
 inline constexpr char legacy_zoneinfo_prefix[] = "/usr/share/zoneinfo";
