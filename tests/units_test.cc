@@ -113,6 +113,16 @@ TEST_F(units_test, the_first_public_file_of_the_right_name_names_the_schema) {
   EXPECT_TRUE(schema_is(first == "4b" ? "44l" : "4b"));
 }
 
+TEST_F(units_test, the_walk_goes_no_deeper) {
+  put("~/tz/x/icutz/sub/file = text\n");
+  const string sub = full("~/tz/x/icutz/sub");
+  const timespec dates[] = {{1, 0}, {2, 0}};  // reading it would renew the first
+  utimensat(AT_FDCWD, sub.c_str(), dates, 0);
+  olm_icu icu(downloads + "x");
+  struct stat status = {};
+  EXPECT_TRUE(stat(sub.c_str(), &status) == 0 && status.st_atime == 1);
+}
+
 TEST_F(units_test, a_walk_that_cannot_start_is_an_error) {
   EXPECT_THROW(olm_icu(string(1, '\0')), filesystem_error);  // fts_open(3) takes no empty path
   EXPECT_EQ(errno, ENOENT);

@@ -35,9 +35,10 @@ trap 'exit 130' INT
 trap 'exit 143' TERM
 
 # All that a command and what it starts leaves in the temporary directory goes with it.
+given=${TMPDIR:-/tmp}
 if ! TMPDIR=$(mktemp -d 2>/dev/null) || ! head -c 1000000 /dev/zero 2>/dev/null >"$TMPDIR/room"; then
   rm -rf "$TMPDIR"
-  fail "the temporary directory is missing or full; name another one in TMPDIR"
+  fail "the temporary directory $given is missing or full; name another one in TMPDIR"
 fi
 rm "$TMPDIR/room"
 remove_at_end+=("$TMPDIR")
@@ -142,7 +143,7 @@ make_root() {
   touch "$root/throw-away"
   install "$(type -P true)" "$root/tmp/true"
   "$root/tmp/true" 2>/dev/null ||
-    fail "programs can't be run in the temporary directory (noexec?); name another one in TMPDIR"
+    fail "programs can't be run in $given (noexec?); name another temporary directory in TMPDIR"
 }
 
 # Puts the program $1 into the root as $2, with the libraries that it needs.

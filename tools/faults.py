@@ -315,6 +315,8 @@ def main():
     options = parser.parse_args()
     if (options.call is None) != (options.fault is None) or options.fault and not options.boot:
         parser.error("--call and --fault go together, with --boot")
+    if "OLMBOOT_PROGRAM" not in os.environ:
+        return 0  # asked about the arguments alone
     if options.call is not None:
         device = Device()
         boot = Boot(device, options.boot)
