@@ -9,7 +9,6 @@
 #include <sys/wait.h>
 #include <unistd.h>
 
-#include <cerrno>
 #include <csignal>
 #include <cstdlib>
 #include <cstring>
@@ -19,7 +18,6 @@
 #include <regex>
 #include <sstream>
 #include <string>
-#include <string_view>
 
 int olmboot_main();
 
@@ -29,10 +27,10 @@ using std::string;
 // Faults on demand. faults.cc stands in for these functions of the whole program: read, symlink,
 // write, operator new, and warn, which never fails.
 struct fault {
-  std::string_view call;  // whose calls fail; none's if empty
-  int error = 0;          // the error number; operator new throws std::bad_alloc instead
-  int first = 1;          // which of its calls fails, counted from 1
-  int seen = 0;           // how many of its calls there were
+  string call;    // whose calls fail; none's if empty
+  int error = 0;  // the error number; operator new throws std::bad_alloc instead
+  int first = 1;  // which of its calls fails, counted from 1
+  int seen = 0;   // how many of its calls there were
 };
 inline fault planned_fault;
 
@@ -70,7 +68,7 @@ class device : public ::testing::Test {
     return std::regex_replace(lines, std::regex("~/"), "/var/db/timezone/");
   }
 
-  // Puts on the device what the lines tell. Files are dated 2040, which 32 bits don't hold.
+  // Puts on the device what the lines tell.
   static void put(const string& lines) {
     std::istringstream stream(full(lines));
     for (string path, what; stream >> path && std::getline(stream >> std::ws, what);) {
@@ -80,24 +78,19 @@ class device : public ::testing::Test {
       if (what == "(directory)") fs::create_directory(path);
       if (what[0] == '&') fs::create_hard_link(what.substr(2), path);
       if (what[0] == '-') fs::create_symlink(what.substr(3), path);
-      if (what[0] != '=') continue;
-      std::ofstream(path) << what.substr(2);
-      const timespec dates[] = {{2208988800, 0}, {2208988800, 0}};
-      utimensat(AT_FDCWD, path.c_str(), dates, 0);
+      if (what[0] == '=') std::ofstream(path) << what.substr(2);
     }
-  }
-
-  static string what_is(const fs::directory_entry& entry) {
-    if (entry.is_symlink()) return "-> " + fs::read_symlink(entry).string();
-    if (!entry.is_regular_file()) return "(directory or pipe)";
-    if (entry.status().permissions() != fs::perms{0664}) return "(not the mode of a new file)";
-    return "= " + (std::ostringstream() << std::ifstream(entry.path()).rdbuf()).str();
   }
 
   static state look() {
     state found;
-    for (const auto& entry : fs::recursive_directory_iterator("/"))
-      found[entry.path()] = what_is(entry);
+    for (const auto& entry : fs::recursive_directory_iterator("/")) {
+      string& what = found[entry.path()] = "(directory or pipe)";
+      if (entry.is_symlink()) what = "-> " + fs::read_symlink(entry).string();
+      if (entry.symlink_status().type() != fs::file_type::regular) continue;
+      what = "= " + (std::ostringstream() << std::ifstream(entry.path()).rdbuf()).str();
+      if (entry.status().permissions() != fs::perms{0664}) what += " (not the mode of a new file)";
+    }
     return found;
   }
 

@@ -6,7 +6,7 @@
 
 #include "device.h"
 
-static bool fails(std::string_view call) {
+static bool fails(const char* call) {
   if (planned_fault.call != call) return false;
   const int seen = ++planned_fault.seen;
   errno = planned_fault.error;  // of no use if the call succeeds

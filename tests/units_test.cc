@@ -1,10 +1,6 @@
 #include <sys/xattr.h>
 
-#include <stdexcept>
-
-#include "dataset/dataset.h"
 #include "dataset/icu.h"
-#include "dataset/zoneinfo.h"
 #include "device.h"
 #include "driver/link_state.h"
 #include "util/first_word.h"
@@ -17,25 +13,20 @@ const string downloads = "/var/db/timezone/tz/";
 
 TEST_F(units_test, versions_are_strictly_ordered) {
   const string ascending[] = {
-      "0a",        "999a",          "2016a",         "2016a.0",   "2016a.0.5",  "2016a.1",
-      "2016a.1.0", "2016a.1.32767", "2016a.1.32768", "2016a.9.9", "2016a.9.10", "2016a.010.2",
-      "2016az",    "2016aza",       "2016b",         "02019a",    "32768a",     "2147483647a"};
+      "999a",        "2016a",  "2016a.0", "2016a.0.5", "2016a.1.0", "2016a.9.10", "2016a.9.32768",
+      "2016a.010.2", "2016az", "2016aza", "2016b",     "02019a",    "2147483647a"};
   for (const auto& a : ascending) {
     for (const auto& b : ascending) {
       EXPECT_EQ(olm_version(a) > olm_version(b), &a > &b) << a << " and " << b;
       EXPECT_EQ(olm_version(a) == olm_version(b), &a == &b) << a << " and " << b;
     }
   }
-  EXPECT_THROW(olm_version("2016a.1.2147483648"), std::out_of_range);
 }
 
 TEST_F(units_test, near_misses_are_no_versions) {
   for (const string text : {"2016", "a", "2016A", "2016z.", "2016a..1", "2016a.1.2.3", "2016a-1",
-                            "2016a.1.0/", " 2016a", "-2016a"}) {
-    olm_version version("2016a.1.0");
-    version.parse(text);
-    EXPECT_EQ(version, olm_version()) << text;
-  }
+                            "2016a.1.0/", " 2016a", "-2016a"})
+    EXPECT_EQ(olm_version(text), olm_version()) << text;
 }
 
 TEST_F(units_test, only_the_text_of_a_zoneinfo_link_counts) {
@@ -47,28 +38,22 @@ TEST_F(units_test, only_the_text_of_a_zoneinfo_link_counts) {
     EXPECT_THROW(parse_zoneinfo_link(text), filesystem_error) << text;
 }
 
-TEST_F(units_test, an_error_is_told_and_thrown_and_stays_the_error_number) {
+TEST_F(units_test, an_error_is_told_and_stays_the_error_number) {
   put("/file = text\n");
-  for (const int error : {ENOTDIR, EINVAL, EEXIST}) {
-    try {
-      if (error == ENOTDIR) primitive::remove("/file/child");
-      if (error == EINVAL) primitive::read_symlink("/file");
-      primitive::create_symlink("/none", "/file");
-      ADD_FAILURE() << error;
-    } catch (const filesystem_error thrown) {
-      EXPECT_TRUE(thrown == error && errno == error && last_warned_error == error) << error;
-    }
-  }
+  EXPECT_THROW(primitive::remove("/file/child"), filesystem_error);
+  EXPECT_TRUE(errno == ENOTDIR && last_warned_error == ENOTDIR);
+  EXPECT_THROW(primitive::read_symlink("/file"), filesystem_error);
+  EXPECT_TRUE(errno == EINVAL && last_warned_error == EINVAL);
+  EXPECT_THROW(primitive::create_symlink("/none", "/file"), filesystem_error);
+  EXPECT_TRUE(errno == EEXIST && last_warned_error == EEXIST);
 }
 
 TEST_F(units_test, a_file_that_may_not_be_read_exists) {
   put("/file = text\n");
   chmod("/", S_IRWXU | S_IXGRP | S_IXOTH);
   chmod("/file", 0);
-  // Root may read it. So the real user, of whom access(2) asks, becomes another one, if there is
-  // one.
   const uid_t user = geteuid();
-  (void)setreuid(1, user);
+  (void)setreuid(1, user);  // root may read it; access(2) asks of the real user
   EXPECT_TRUE(primitive::exists("/file"));
   ASSERT_EQ(setreuid(user, user), 0);
 }
@@ -127,17 +112,6 @@ TEST_F(units_test, a_walk_that_cannot_start_is_an_error) {
   EXPECT_THROW(olm_icu(string(1, '\0')), filesystem_error);  // fts_open(3) takes no empty path
   EXPECT_EQ(errno, ENOENT);
   EXPECT_STREQ(printed, "tz_icu::initialize: fts_open of  failed, No such file or directory\n");
-}
-
-TEST_F(units_test, an_ICU_component_fits_no_other_kind) {
-  EXPECT_FALSE(olm_icu().compatible_schema(olm_zoneinfo()));
-  EXPECT_STREQ(printed, "olm_icu::compatible_schema: could not dynamic_cast other component\n");
-}
-
-TEST_F(units_test, data_sets_are_equal_by_path_not_by_version) {
-  put("/usr/share/zoneinfo.default/+VERSION = 2016b\n");
-  EXPECT_TRUE(olm_dataset() == olm_dataset(""));
-  EXPECT_FALSE(olm_dataset() == olm_dataset(downloads + "2016b.1.0"));
 }
 
 TEST_F(units_test, the_directories_get_class_d) {
