@@ -42,10 +42,10 @@ const olm_pattern& data_file_pattern() {
   return pattern;
 }
 
-// Whether others may read it, and it lies directly in the directory walked, which is at level 0.
-bool is_public_file_at_top(const FTSENT& entry) {
-  return entry.fts_errno == 0 && entry.fts_level == 1 && entry.fts_namelen != 0 &&
-         entry.fts_info == FTS_F && (entry.fts_statp->st_mode & S_IROTH) != 0;
+// Whether it is a regular file that others may read.
+bool is_public_file(const FTSENT& entry) {
+  return entry.fts_errno == 0 && entry.fts_namelen != 0 && entry.fts_info == FTS_F &&
+         (entry.fts_statp->st_mode & S_IROTH) != 0;
 }
 
 }  // namespace
@@ -68,11 +68,11 @@ void olm_icu::initialize() {
 std::string olm_icu::schema_of_data_file() const {
   const directory_walk walk = open_walk(directory);
   while (FTSENT* const entry = fts_read(walk.get())) {
+    if (entry->fts_level == 0) continue;  // the directory itself
     // What lies deeper is never chosen, however much it is.
-    if (entry->fts_level > 0) fts_set(walk.get(), entry, FTS_SKIP);
+    fts_set(walk.get(), entry, FTS_SKIP);
     std::cmatch results;
-    if (is_public_file_at_top(*entry) &&
-        std::regex_match(entry->fts_name, results, data_file_pattern())) {
+    if (is_public_file(*entry) && std::regex_match(entry->fts_name, results, data_file_pattern())) {
       return results[1];
     }
   }

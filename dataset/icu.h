@@ -30,6 +30,7 @@ class olm_icu final : public olm_dataset_component {
   void initialize();
   // Returns the schema in the name of the first data file that the walk of `directory` delivers: a
   // regular file directly in it that others may read. Returns the empty string when there is none.
+  // Links in the walk are not followed, and nothing below its entries is looked at.
   std::string schema_of_data_file() const;
 
   std::string schema;

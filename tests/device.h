@@ -42,8 +42,7 @@ inline int last_warned_error;  // the error number that warn was to tell
 
 // A throw-away device: a temporary directory that is the root while a test runs. A line tells what
 // stands at a path; "~/" is short for the program's own directory there and in what is printed:
-//   "PATH -> TARGET"   "PATH = TEXT"   "PATH & OTHER_NAME"   "PATH (KIND)"
-// KIND is pipe, directory or absent.
+//   "PATH -> TARGET"   "PATH = TEXT"   "PATH & OTHER_NAME"   "PATH (pipe, directory or absent)"
 class device : public ::testing::Test {
  protected:
   using state = std::map<string, string>;  // what stands at each path
@@ -68,7 +67,6 @@ class device : public ::testing::Test {
     return std::regex_replace(lines, std::regex("~/"), "/var/db/timezone/");
   }
 
-  // Puts on the device what the lines tell.
   static void put(const string& lines) {
     std::istringstream stream(full(lines));
     for (string path, what; stream >> path && std::getline(stream >> std::ws, what);) {
@@ -105,7 +103,6 @@ class device : public ::testing::Test {
   }
 
   // Runs the program in a child. Returns its status, no_fault, or 128 and the signal that ended it.
-  // Like main, lets nothing that is thrown pass.
   static int boot(const fault& plan = {}) noexcept {
     std::memset(printed, 0, printed_size);
     std::fflush(stdout);
