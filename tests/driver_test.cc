@@ -1,7 +1,5 @@
 #include "device.h"
 
-namespace {
-
 // What stands on a device: constants. On this one a run changes and prints nothing; each case puts
 // something else there.
 const string at_rest =
@@ -151,7 +149,6 @@ TEST_P(memory_test, each_allocation_fails) {
   const string start = "/usr (absent)\n/var (absent)\n" + at_rest + GetParam().before;
   put(start);
   boot();
-  boot();
   state undisturbed = look();
   // The text of the default zone's link, and the paths of the migration, are in no handler's care.
   int unguarded = GetParam().name == "new_device" ? 3 : GetParam().name == "older_entries" ? 1 : 0;
@@ -170,5 +167,3 @@ TEST_P(memory_test, each_allocation_fails) {
 const auto name_of = [](const auto& row) { return row.param.name; };
 INSTANTIATE_TEST_SUITE_P(all, driver_test, ::testing::ValuesIn(cases), name_of);
 INSTANTIATE_TEST_SUITE_P(typical, memory_test, ::testing::ValuesIn(cases, cases + 6), name_of);
-
-}  // namespace
