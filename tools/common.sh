@@ -85,7 +85,7 @@ need_root() {
 
 # Makes the build folder.
 need_build_folder() {
-  if ! { mkdir -p "$build" && touch "$build/lock"; } 2>/dev/null; then
+  if ! { mkdir -p "$build" && : >>"$build/lock"; } 2>/dev/null; then
     fail "$build can't be written; name another folder in OLMBOOT_BUILD"
   fi
 }
