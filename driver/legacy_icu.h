@@ -9,5 +9,6 @@
 void migrate_legacy_icu_link();
 
 // Removes the ICU entry of older systems if it is a file, a link or an empty directory. Anything
-// else stays. Prints nothing and throws nothing.
+// else stays.
+// Prints nothing and throws nothing.
 void remove_legacy_icu_entry() noexcept;
