@@ -90,8 +90,8 @@ need_build_folder() {
   fi
 }
 
-# Configures and builds the preset $1 in $build/$1, with further CMake options. Shows the output only
-# when that fails, and warnings always. One command builds at a time.
+# Configures and builds the preset $1 in $build/$1, without what was set there before. Shows the output
+# only when that fails, and warnings always. One command builds at a time.
 build_preset() {
   local log=$TMPDIR/build.log status=0
   need_build_folder
@@ -101,7 +101,9 @@ build_preset() {
     flock 9
   fi
   echo "Building preset '$1'"
-  (cd "$project" && cmake --preset "$1" -B "$build/$1" "${@:2}" &&
+  # --fresh would build everything again, too.
+  rm -f "$build/$1/CMakeCache.txt"
+  (cd "$project" && cmake --preset "$1" -B "$build/$1" &&
     cmake --build "$build/$1" -j "$(nproc)") >"$log" 2>&1 || status=$?
   if [ $status = 0 ]; then
     grep -A 3 'warning:' "$log" || true
