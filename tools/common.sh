@@ -3,6 +3,7 @@
 
 export LC_ALL=C
 unset CDPATH
+umask 022
 project=$(dirname "$(dirname "$(readlink -f "${BASH_SOURCE[0]}")")")
 build=$(realpath -m "${OLMBOOT_BUILD:-$project/build}")
 
@@ -43,9 +44,20 @@ fi
 rm "$TMPDIR/room"
 remove_at_end+=("$TMPDIR")
 export TMPDIR
+log=$TMPDIR/log # of what is quiet
 
-# Installs those of the given Debian packages that are missing; says so, or what to do where it
-# can't. On another machine it says what is needed and goes on.
+# quietly WHAT COMMAND...: says WHAT, runs the command with its output in $log, and says how long it took.
+# Returns the command's status.
+quietly() {
+  local start=$SECONDS status=0
+  printf '%s ... ' "$1"
+  "${@:2}" >"$log" 2>&1 </dev/null || status=$?
+  if [ $status = 0 ]; then echo "$((SECONDS - start)) s"; else echo failed; fi
+  return $status
+}
+
+# Installs those of the given Debian packages that are missing, or says what to do where it can't. On
+# another machine it says what is needed and goes on.
 need_packages() {
   local package missing=() as_root=()
   if ! command -v dpkg-query >/dev/null || ! command -v apt-get >/dev/null; then
@@ -58,17 +70,14 @@ need_packages() {
       missing+=("$package")
   done
   [ ${#missing[@]} -gt 0 ] || return 0
-  local by_hand="run as root: apt-get update && apt-get install ${missing[*]}"
   if [ "$(id -u)" != 0 ]; then
-    command -v sudo >/dev/null || fail "packages are missing; $by_hand"
+    command -v sudo >/dev/null ||
+      fail "packages are missing; run as root: apt-get update && apt-get install ${missing[*]}"
     as_root=(sudo)
   fi
-  echo "Installing what is missing: ${missing[*]}"
-  if ! "${as_root[@]}" apt-get update -qq >&2 ||
-    ! "${as_root[@]}" env DEBIAN_FRONTEND=noninteractive \
-      apt-get install -y -qq --no-install-recommends "${missing[@]}" >/dev/null; then
-    fail "that failed; $by_hand"
-  fi
+  quietly "Installing ${missing[*]}" "${as_root[@]}" sh -c 'apt-get update -qq &&
+    DEBIAN_FRONTEND=noninteractive apt-get install -y -qq --no-install-recommends "$@"' - "${missing[@]}" ||
+    fail "apt-get: $(tail -n 1 "$log")"
 }
 
 # Runs a command as root: of the machine, or of a user namespace.
@@ -90,22 +99,22 @@ need_build_folder() {
   fi
 }
 
+configure_and_build() {
+  (cd "$project" && cmake --preset "$1" -B "$build/$1" && cmake --build "$build/$1" -j "$(nproc)")
+}
+
 # Configures and builds the preset $1 in $build/$1, without what was set there before. Shows the output
 # only when that fails, and warnings always. One command builds at a time.
 build_preset() {
-  local log=$TMPDIR/build.log status=0
   need_build_folder
   exec 9>"$build/lock"
   if ! flock -n 9; then
     echo "Another command is building; waiting for it."
     flock 9
   fi
-  echo "Building preset '$1'"
   # --fresh would build everything again, too.
   rm -f "$build/$1/CMakeCache.txt"
-  (cd "$project" && cmake --preset "$1" -B "$build/$1" &&
-    cmake --build "$build/$1" -j "$(nproc)") >"$log" 2>&1 || status=$?
-  if [ $status = 0 ]; then
+  if quietly "Building preset '$1'" configure_and_build "$1"; then
     grep -A 3 'warning:' "$log" || true
   else
     # Without what went well, and clang-tidy's count of what it found in the system's headers.
@@ -115,31 +124,18 @@ build_preset() {
   exec 9>&-
 }
 
-# Makes a small Debian system of release $1 with the packages $2, $3, ..., and names it in $debian. It
-# stays in the build folder for the next time. To be called by root.
-make_debian() {
-  local release=$1 packages=${*:2} new
-  debian=$build/debian/$release${packages:+.$(cksum <<<"$packages" | cut -d ' ' -f 1)}
-  [ ! -e "$debian" ] || return 0
-  need_packages debootstrap
-  [ -e "/usr/share/debootstrap/scripts/${release//\//.}" ] || fail "there is no release '$release'"
-  echo "Making a Debian system in $debian"
-  need_build_folder
-  mkdir -p "$build/debian"
-  new=$(mktemp -d "$debian.XXXXXX")
-  remove_at_end+=("$new")
-  # What debootstrap mounts goes with the namespace.
-  unshare --mount debootstrap --variant=minbase ${packages:+"--include=${packages// /,}"} "$release" "$new" \
-    >"$TMPDIR/debootstrap" 2>&1 ||
-    fail "debootstrap failed in $debian: $(grep . "$TMPDIR/debootstrap" | tail -n 1)"
-  chmod 755 "$new"
-  mv -T "$new" "$debian"
+# Builds the Debian package of the checkout, and names it in $package.
+build_package() {
+  mkdir -p "$TMPDIR/package/source"
+  tar -C "$project" --exclude=./build --exclude=./.git -c . | tar -C "$TMPDIR/package/source" -x
+  quietly "Building the package" env --chdir="$TMPDIR/package/source" DEB_BUILD_OPTIONS=nocheck \
+    DEB_BUILD_PROFILES=nocheck dpkg-buildpackage -us -uc -b || fail "$(tail -n 3 "$log")"
+  package=$(echo "$TMPDIR"/package/olmboot_*.deb)
 }
 
 # Makes an empty throw-away root and names it in $root. It has a mark, which the benchmark looks for
 # before it removes anything.
 make_root() {
-  umask 022
   root=$TMPDIR/root
   mkdir -p "$root"/{tmp,sbin,usr/share/{icu,zoneinfo.default},var/db/timezone/tz}
   touch "$root/throw-away"
