@@ -115,6 +115,18 @@ build_preset() {
   exec 9>&-
 }
 
+# Builds the Debian package for the architecture $1, or this machine's, in a copy of the checkout, and
+# names it in $package. It doesn't run the tests.
+build_package() {
+  local folder=$TMPDIR/${1:-$(dpkg --print-architecture)}
+  echo "Building the package for ${folder##*/}"
+  mkdir -p "$folder/olmboot"
+  tar c -C "$project" --exclude=./.git --exclude=./build . | tar x -C "$folder/olmboot"
+  (cd "$folder/olmboot" && dpkg-buildpackage -us -uc -Pnocheck "-a${folder##*/}") >"$TMPDIR/build.log" 2>&1 ||
+    { cat "$TMPDIR/build.log" >&2 && fail "the build of the package failed"; }
+  package=$(echo "$folder"/olmboot_*.deb)
+}
+
 # Makes a small Debian system of release $1 with the packages $2, $3, ..., and names it in $debian. It
 # stays in the build folder for the next time. To be called by root.
 make_debian() {
