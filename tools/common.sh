@@ -124,13 +124,17 @@ build_preset() {
   exec 9>&-
 }
 
-# Builds the Debian package of the checkout, and names it in $package.
+# Builds the Debian package for the architecture $1, or this machine's, in a copy of the checkout, and
+# names it in $package. It doesn't run the tests.
 build_package() {
-  mkdir -p "$TMPDIR/package/source"
-  tar -C "$project" --exclude=./build --exclude=./.git -c . | tar -C "$TMPDIR/package/source" -x
-  quietly "Building the package" env --chdir="$TMPDIR/package/source" DEB_BUILD_OPTIONS=nocheck \
-    DEB_BUILD_PROFILES=nocheck dpkg-buildpackage -us -uc -b || fail "$(tail -n 3 "$log")"
-  package=$(echo "$TMPDIR"/package/olmboot_*.deb)
+  local architecture=${1:-$(dpkg --print-architecture)}
+  local folder=$TMPDIR/$architecture
+  mkdir -p "$folder/olmboot"
+  tar c -C "$project" --exclude=./.git --exclude=./build . | tar x -C "$folder/olmboot"
+  quietly "Building the package for $architecture" env --chdir="$folder/olmboot" \
+    dpkg-buildpackage -us -uc -Pnocheck "-a$architecture" ||
+    { cat "$log" >&2 && fail "the build of the package failed"; }
+  package=$(echo "$folder"/olmboot_*.deb)
 }
 
 # Makes an empty throw-away root and names it in $root. It has a mark, which the benchmark looks for
