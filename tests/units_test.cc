@@ -77,6 +77,8 @@ TEST_F(units_test, a_word_ends_at_white_space_and_its_file_somewhere) {
   planned_fault = {"read", EIO, 2};
   const string cut = read_first_word("/long");
   EXPECT_EQ(cut.empty(), planned_fault.seen >= 2);
+  planned_fault = {"stat"};
+  EXPECT_EQ(read_first_word("/long"), "xx");
 }
 
 TEST_F(units_test, the_first_public_file_of_the_right_name_names_the_schema) {

@@ -3,6 +3,7 @@
 #include <sys/stat.h>
 
 #include <fstream>
+#include <iomanip>
 
 namespace {
 
@@ -17,10 +18,12 @@ std::string read_first_word(const std::string& path) {
       status.st_size > largest_size) {
     return word;
   }
-  // For the longest word. One that grows takes up to four times its size.
+  // Room for the longest word: one that grows takes up to four times its size.
   word.reserve(static_cast<std::size_t>(status.st_size));
   std::ifstream file(path);
+  // A larger file may stand at the path by now.
+  file >> std::setw(static_cast<int>(status.st_size)) >> word;
   // A read error can cut a word short; what is left is not the word.
-  if (!(file >> word)) word.clear();
+  if (!file) word.clear();
   return word;
 }
