@@ -7,10 +7,9 @@
 #include "device.h"
 
 static bool fails(const char* call) {
-  if (planned_fault.call != call) return false;
-  const int seen = ++planned_fault.seen;
-  errno = planned_fault.error;  // of no use if the call succeeds
-  return seen == planned_fault.first;
+  if (planned_fault.call == nullptr || std::strcmp(planned_fault.call, call) != 0) return false;
+  errno = EIO;  // of no use if the call succeeds
+  return --planned_fault.nth == 0;
 }
 
 // The file streams of libstdc++ call it, those of libc++ don't.
