@@ -48,7 +48,7 @@ string unparsed(const string& word) {
 string correcting(const string& target) { return "Correcting localtime link to " + target + "\n"; }
 
 struct boot_case {
-  string name, before, printed, changed = "";
+  string name, before, printed, changed = {};
   int status = 0;
   fault plan = {};
 };

@@ -2,6 +2,7 @@
 
 #include <sys/stat.h>
 
+#include <cstdint>
 #include <ctime>
 #include <fstream>
 #include <iomanip>
@@ -11,7 +12,7 @@ namespace {
 constexpr off_t largest_size = 16 << 20;  // in bytes
 
 // Narrower, and stat(2) and fts(3) refuse a file of more than 2 GiB or dated past 2038.
-static_assert(sizeof(off_t) >= 8 && sizeof(std::time_t) >= 8,
+static_assert(sizeof(off_t) >= sizeof(std::int64_t) && sizeof(std::time_t) >= sizeof(std::int64_t),
               "build with -D_FILE_OFFSET_BITS=64 and -D_TIME_BITS=64");
 
 }  // namespace
