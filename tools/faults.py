@@ -32,9 +32,10 @@ POSSIBLE = {"brk": ("ENOMEM",), "mmap": ("ENOMEM",), "munmap": ("ENOMEM",), "rt_
             "futex": (), "exit_group": ()}
 TIME_LIMIT = 20  # seconds
 
-# A whole line of warn(3).
+# A whole line of warn(3), and a primitive's, whose cause the next line repeats.
 WARNING = re.compile("olmboot: .+: (%s)" % "|".join(
     re.escape(text) for text in {os.strerror(number) for number in range(134)}))
+PRIMITIVE = re.compile("olmboot: (read_symlink|remove|create_symlink): ")
 
 
 def active(data_set):
@@ -56,15 +57,22 @@ COMMON = {
     LOCALTIME: f"-> {ZONEINFO}/Europe/Paris",
 }
 UPDATED = {**COMMON, **active(DOWNLOAD), RECORD: "2016b.1.0_2016c.1.0"}
+# What stands on the device before a boot, and what the boot must make of it.
 BOOTS = {
-    "new device": {path: what for path, what in COMMON.items()
-                   if not path.startswith(STORAGE)} | {STORAGE + "tz/none": ""},
-    "update": {**COMMON, ZONEINFO: ON_SYSTEM},
-    "newer download": {**COMMON, **active(OLDER_DOWNLOAD), RECORD: "2016b.1.0_2016b.2.0"},
-    "nothing new": UPDATED,
-    "system upgrade": {**UPDATED, SYSTEM_TREE + "/+VERSION": "2016d\n"},
-    "older entries": {**UPDATED, ICUTZ: ABSENT, OLD_ICUTZ: f"-> {DOWNLOAD}/icutz", OLD_ICU: "",
-                      LOCALTIME: "-> /usr/share/zoneinfo/Europe/Paris"},
+    "new device": (
+        {path: what for path, what in COMMON.items() if not path.startswith(STORAGE)}
+        | {STORAGE + "tz/none": ""},
+        {ZONEINFO: ON_SYSTEM, LOCALTIME: f"-> {ZONEINFO}/America/Los_Angeles"}),
+    "update": ({**COMMON, ZONEINFO: ON_SYSTEM}, UPDATED),
+    "newer download": ({**COMMON, **active(OLDER_DOWNLOAD), RECORD: "2016b.1.0_2016b.2.0"},
+                       {**UPDATED, RECORD: "2016b.2.0_2016c.1.0"}),
+    "nothing new": (UPDATED, UPDATED),
+    "system upgrade": ({**UPDATED, SYSTEM_TREE + "/+VERSION": "2016d\n"},
+                       {ZONEINFO: ON_SYSTEM, ICUTZ: ABSENT}),
+    "older entries": (
+        {**UPDATED, ICUTZ: ABSENT, OLD_ICUTZ: f"-> {DOWNLOAD}/icutz", OLD_ICU: "",
+         LOCALTIME: "-> /usr/share/zoneinfo/Europe/Paris"},
+        {**UPDATED, OLD_ICUTZ: ABSENT, OLD_ICU: ABSENT}),
 }
 
 
@@ -186,6 +194,10 @@ def caveat(run, path, was, found):
     return None
 
 
+def cause(line):
+    return line.rpartition(": ")[2]
+
+
 class Run:
     """One fault of a boot: what the run left, what the next boot did, and what was wrong."""
 
@@ -213,6 +225,9 @@ class Run:
         if not self.call.line.startswith("write(2,"):
             self.violations += [f"this line is not a warning: {line}" for line in self.lines
                                 if not WARNING.fullmatch(line)]
+            self.violations += [f"this line tells another cause than the one before it: {later}"
+                                for line, later in zip(self.lines, self.lines[1:])
+                                if PRIMITIVE.match(line) and cause(line) != cause(later)]
         if self.status is None:
             self.violations.append(f"no end after {TIME_LIMIT} s")
         elif self.status == 1 and re.match(f'symlink.*"{LOCALTIME}"', self.call.line):
@@ -260,17 +275,22 @@ class Boot:
     """A boot of the device `start`: its calls, and what one and two undisturbed runs leave."""
 
     def __init__(self, device, name):
-        self.name, self.start = name, BOOTS[name]
+        self.start, purpose = BOOTS[name]
         self.calls = calls_of(device, self.start)
         device.put(self.start)
         self.before = device.look()
         device.boot()
+        once = device.look()
+        for path, what in purpose.items():
+            if once.get(path, ABSENT) != what:
+                sys.exit(f"faults: the boot '{name}' leaves {path} {once.get(path, ABSENT)!r}")
         device.boot()
         self.after = device.look()
 
 
 def make_every_fault(name):
-    """Makes every fault of one boot happen, prints its row, and returns its violations."""
+    """Makes every fault of one boot happen, and prints its row and its violations. Returns the
+    numbers of the row, and how many runs each exception explains."""
     boot = Boot(Device(), name)
     faults = [(n, fault) for n, call in enumerate(boot.calls) for fault in call.injection]
     devices = queue.SimpleQueue()
@@ -283,16 +303,24 @@ def make_every_fault(name):
         devices.put(device)
         return run
 
+    runs = []
     with multiprocessing.pool.ThreadPool(os.cpu_count()) as pool:
-        runs = pool.map(work, faults)
+        for run in pool.imap(work, faults):
+            runs.append(run)
+            if sys.stdout.isatty():
+                print(f"{name}: {len(runs)} of {len(faults)} runs", end="\r", flush=True)
     exceptions = collections.Counter(itertools.chain(*(run.exceptions for run in runs)))
-    violations = [
-        f"{violation}; see it: tools/faults --boot '{name}' --call {n + 1} --fault {fault}"
-        for (n, fault), run in zip(faults, runs) for violation in run.violations]
-    row = ", ".join(f"{exception} {count}" for exception, count in sorted(exceptions.items()))
-    print(f"{name:15} {len(boot.calls):5} {len(faults) - len(boot.calls):6} {len(boot.calls):5} "
-          f"{len(violations):10}  {row}", flush=True)
-    return violations
+    violations = [(violation, n + 1, fault)
+                  for (n, fault), run in zip(faults, runs) for violation in run.violations]
+    numbers = [len(boot.calls), len(faults) - len(boot.calls), len(boot.calls), len(violations)]
+    print_row(name, numbers)
+    for violation, call, fault in violations:
+        print(f"  {violation}\n    tools/faults --boot '{name}' --call {call} --fault {fault}")
+    return numbers, exceptions
+
+
+def print_row(name, numbers):
+    print(f"{name:24}", *(f"{number:>11}" for number in numbers), flush=True)
 
 
 def main():
@@ -316,18 +344,22 @@ def main():
         run = Run(device, boot, call, options.fault)
         run.show()
         return 1 if run.violations else 0
-    print("boot            calls faults kills violations  exceptions")
-    violations = []
+    print_row("boot", ("calls", "errors", "kills", "violations"))
+    total, exceptions = [0, 0, 0, 0], collections.Counter()
     for name in [options.boot] if options.boot else BOOTS:
-        violations += make_every_fault(name)
-    for violation in violations:
-        print(violation)
-    print("olmboot(8) explains the exceptions: status 1 under EXIT STATUS, others under CAVEATS.")
-    print(f"{len(violations)} violations")
-    return 1 if violations else 0
+        numbers, explained = make_every_fault(name)
+        total = [sum(pair) for pair in zip(total, numbers)]
+        exceptions += explained
+    print_row("all", total)
+    runs = total[1] + total[2]
+    print(f"{runs:,} runs. Of these olmboot(8) explains under EXIT STATUS or CAVEATS:")
+    for exception, count in sorted(exceptions.items()):
+        print(f"{count:6} {exception}")
+    return 1 if total[3] else 0
 
 
 if __name__ == "__main__":
+    signal.signal(signal.SIGPIPE, signal.SIG_DFL)  # a reader may have seen enough
     try:
         sys.exit(main())
     except KeyboardInterrupt:
