@@ -3,16 +3,15 @@
 
 import argparse
 import collections
-import itertools
 import multiprocessing.pool
 import os
-import queue
 import re
 import shutil
 import signal
 import subprocess
 import sys
 import tempfile
+import threading
 
 STORAGE = "/var/db/timezone/"
 ZONEINFO, ICUTZ, LOCALTIME, LATEST, RECORD = (
@@ -30,7 +29,7 @@ ERRORS = ("EIO", "EACCES", "ENOSPC", "EROFS", "ENOMEM", "EMFILE", "EINTR")
 # What a call can fail with, where that isn't each of these.
 POSSIBLE = {"brk": ("ENOMEM",), "mmap": ("ENOMEM",), "munmap": ("ENOMEM",), "rt_sigaction": (),
             "futex": (), "exit_group": ()}
-TIME_LIMIT = 20  # seconds
+TIME_LIMIT = "20"  # seconds
 
 # A whole line of warn(3), and a primitive's, whose cause the next line repeats.
 WARNING = re.compile("olmboot: .+: (%s)" % "|".join(
@@ -59,10 +58,8 @@ COMMON = {
 UPDATED = {**COMMON, **active(DOWNLOAD), RECORD: "2016b.1.0_2016c.1.0"}
 # What stands on the device before a boot, and what the boot must make of it.
 BOOTS = {
-    "new device": (
-        {path: what for path, what in COMMON.items() if not path.startswith(STORAGE)}
-        | {STORAGE + "tz/none": ""},
-        {ZONEINFO: ON_SYSTEM, LOCALTIME: f"-> {ZONEINFO}/America/Los_Angeles"}),
+    "new device": ({path: what for path, what in COMMON.items() if not path.startswith(STORAGE)}
+                   | {STORAGE + "tz/none": ""}, {ZONEINFO: ON_SYSTEM}),
     "update": ({**COMMON, ZONEINFO: ON_SYSTEM}, UPDATED),
     "newer download": ({**COMMON, **active(OLDER_DOWNLOAD), RECORD: "2016b.1.0_2016b.2.0"},
                        {**UPDATED, RECORD: "2016b.2.0_2016c.1.0"}),
@@ -115,28 +112,23 @@ class Device:
 
     def boot(self, *injection):
         """Runs the program. Returns its status, a signal's negated, and the lines that it printed;
-        one on standard output says so. Ends it at the time limit, with the status None."""
+        one on standard output says so. Kills it at the time limit."""
         command = ["setarch", "-R", "chroot", self.root, "/sbin/olmboot"]
         if injection:
             command = ["strace", "-o", self.trace_file, *injection, *command]
-        with subprocess.Popen(command, stdout=subprocess.PIPE, stderr=subprocess.PIPE,
-                              start_new_session=True) as run:
-            try:
-                output, lines = run.communicate(timeout=TIME_LIMIT)
-            except subprocess.TimeoutExpired:
-                os.killpg(run.pid, signal.SIGKILL)  # strace and the program
-                return None, []
+        run = subprocess.run(["timeout", "-s", "KILL", TIME_LIMIT, *command],
+                             capture_output=True, check=False, text=True)
         # strace has a word to say about an address that 32 bits don't hold.
         return run.returncode, [
-            line for line in lines.decode().splitlines() if not line.startswith("strace: ")
-        ] + ["on standard output: " + line for line in output.decode().splitlines()]
+            line for line in run.stderr.splitlines() if not line.startswith("strace: ")
+        ] + ["on standard output: " + line for line in run.stdout.splitlines()]
 
     def trace(self):
         with open(self.trace_file, encoding="utf-8") as file:
             return file.read().splitlines()
 
 
-Call = collections.namedtuple("Call", "name line injection")  # injection: of a fault, by its name
+Call = collections.namedtuple("Call", "number name line injection")  # the last: of each fault
 
 
 def calls_of(device, start):
@@ -155,7 +147,7 @@ def calls_of(device, start):
             if name == "brk":
                 faults["ENOMEM"] = inject.format("retval=" + old_end)  # that is how it fails
             faults["kill"] = inject.format("signal=SIGKILL")
-            calls.append(Call(name, line, faults))
+            calls.append(Call(len(calls) + 1, name, line, faults))
         else:
             early = [] if name == "execve" else early + re.findall('"/(?:usr|var)/[^"]*"', line)
         if name == "brk":
@@ -194,10 +186,6 @@ def caveat(run, path, was, found):
     return None
 
 
-def cause(line):
-    return line.rpartition(": ")[2]
-
-
 class Run:
     """One fault of a boot: what the run left, what the next boot did, and what was wrong."""
 
@@ -225,12 +213,10 @@ class Run:
         if not self.call.line.startswith("write(2,"):
             self.violations += [f"this line is not a warning: {line}" for line in self.lines
                                 if not WARNING.fullmatch(line)]
-            self.violations += [f"this line tells another cause than the one before it: {later}"
-                                for line, later in zip(self.lines, self.lines[1:])
-                                if PRIMITIVE.match(line) and cause(line) != cause(later)]
-        if self.status is None:
-            self.violations.append(f"no end after {TIME_LIMIT} s")
-        elif self.status == 1 and re.match(f'symlink.*"{LOCALTIME}"', self.call.line):
+            for line, later in zip(self.lines, self.lines[1:]):
+                if PRIMITIVE.match(line) and not later.endswith(line.split(": ")[-1]):
+                    self.violations.append(f"another cause than in the line before: {later}")
+        if self.status == 1 and re.match(f'symlink.*"{LOCALTIME}"', self.call.line):
             self.exceptions.append("status 1")
         elif self.status != 0:
             self.violations.append(f"status {self.status}")
@@ -267,15 +253,13 @@ class Run:
             for path in sorted(earlier.keys() | later.keys()):
                 if earlier.get(path) != later.get(path):
                     print(f"{title}: {path} {later.get(path, ABSENT)}")
-        for title, texts in (("exception", self.exceptions), ("violation", self.violations)):
-            print(*(f"{title}: {text}" for text in texts), sep="\n", end="\n" if texts else "")
 
 
 class Boot:
     """A boot of the device `start`: its calls, and what one and two undisturbed runs leave."""
 
     def __init__(self, device, name):
-        self.start, purpose = BOOTS[name]
+        self.name, (self.start, purpose) = name, BOOTS[name]
         self.calls = calls_of(device, self.start)
         device.put(self.start)
         self.before = device.look()
@@ -288,39 +272,37 @@ class Boot:
         self.after = device.look()
 
 
-def make_every_fault(name):
-    """Makes every fault of one boot happen, and prints its row and its violations. Returns the
-    numbers of the row, and how many runs each exception explains."""
-    boot = Boot(Device(), name)
-    faults = [(n, fault) for n, call in enumerate(boot.calls) for fault in call.injection]
-    devices = queue.SimpleQueue()
-    for _ in range(os.cpu_count()):
-        devices.put(Device())
+def make_faults(options, name):
+    """Makes those faults of a boot happen that the options choose. Prints the boot's row and its
+    violations, and returns its runs."""
+    boot, runs, local = Boot(Device(), name), [], threading.local()
+    faults = [(call, fault) for call in boot.calls for fault in call.injection
+              if options.call in (None, call.number) and options.fault in (None, fault)]
 
-    def work(at):
-        device = devices.get()
-        run = Run(device, boot, boot.calls[at[0]], at[1])
-        devices.put(device)
-        return run
+    def work(fault):
+        if not hasattr(local, "device"):
+            local.device = Device()
+        return Run(local.device, boot, *fault)
 
-    runs = []
     with multiprocessing.pool.ThreadPool(os.cpu_count()) as pool:
         for run in pool.imap(work, faults):
             runs.append(run)
             if sys.stdout.isatty():
                 print(f"{name}: {len(runs)} of {len(faults)} runs", end="\r", flush=True)
-    exceptions = collections.Counter(itertools.chain(*(run.exceptions for run in runs)))
-    violations = [(violation, n + 1, fault)
-                  for (n, fault), run in zip(faults, runs) for violation in run.violations]
-    numbers = [len(boot.calls), len(faults) - len(boot.calls), len(boot.calls), len(violations)]
-    print_row(name, numbers)
-    for violation, call, fault in violations:
-        print(f"  {violation}\n    tools/faults --boot '{name}' --call {call} --fault {fault}")
-    return numbers, exceptions
+    print_row(name, runs)
+    for run in runs:
+        for violation in run.violations:
+            print(f"  {violation}\n    tools/faults --boot '{name}' --call {run.call.number} "
+                  f"--fault {run.fault}")
+        if options.call:
+            run.show()
+    return runs
 
 
-def print_row(name, numbers):
-    print(f"{name:24}", *(f"{number:>11}" for number in numbers), flush=True)
+def print_row(name, runs):
+    kills = sum(run.fault == "kill" for run in runs)
+    wrong = sum(len(run.violations) for run in runs)
+    print(f"{name:24}{len(runs):10,}{len(runs) - kills:10,}{kills:10,}{wrong:12,}", flush=True)
 
 
 def main():
@@ -329,38 +311,23 @@ def main():
     parser.add_argument("--call", type=int)
     parser.add_argument("--fault", choices=(*ERRORS, "kill"))
     options = parser.parse_args()
-    if (options.call is None) != (options.fault is None) or options.fault and not options.boot:
-        parser.error("--call and --fault go together, with --boot")
     if "OLMBOOT_PROGRAM" not in os.environ:
         return 0  # asked about the arguments alone
-    if options.call is not None:
-        device = Device()
-        boot = Boot(device, options.boot)
-        if not 1 <= options.call <= len(boot.calls):
-            parser.error(f"the boot has the calls 1 to {len(boot.calls)}")
-        call = boot.calls[options.call - 1]
-        if options.fault not in call.injection:
-            parser.error(f"this call has the faults {', '.join(call.injection)}: {call.line}")
-        run = Run(device, boot, call, options.fault)
-        run.show()
-        return 1 if run.violations else 0
-    print_row("boot", ("calls", "errors", "kills", "violations"))
-    total, exceptions = [0, 0, 0, 0], collections.Counter()
+    print("boot                          runs    errors     kills  violations")
+    runs = []
     for name in [options.boot] if options.boot else BOOTS:
-        numbers, explained = make_every_fault(name)
-        total = [sum(pair) for pair in zip(total, numbers)]
-        exceptions += explained
-    print_row("all", total)
-    runs = total[1] + total[2]
-    print(f"{runs:,} runs. Of these olmboot(8) explains under EXIT STATUS or CAVEATS:")
+        runs += make_faults(options, name)
+    if not runs:
+        parser.error("no boot has that call and fault")
+    print_row("all", runs)
+    print("olmboot(8) explains under EXIT STATUS or CAVEATS what these runs left:")
+    exceptions = collections.Counter(name for run in runs for name in run.exceptions)
     for exception, count in sorted(exceptions.items()):
-        print(f"{count:6} {exception}")
-    return 1 if total[3] else 0
+        print(f"{exception:24}{count:10,}")
+    return 1 if any(run.violations for run in runs) else 0
 
 
 if __name__ == "__main__":
-    signal.signal(signal.SIGPIPE, signal.SIG_DFL)  # a reader may have seen enough
-    try:
-        sys.exit(main())
-    except KeyboardInterrupt:
-        os._exit(130)
+    for ending in (signal.SIGINT, signal.SIGPIPE):
+        signal.signal(ending, signal.SIG_DFL)  # at once, without a traceback
+    sys.exit(main())
