@@ -1,6 +1,7 @@
 // Times whole boots of olmboot against the floor, a program that makes the same file calls and does
 // nothing else. To be started by tools/bench, in whose throw-away root both lie.
 #include <benchmark/benchmark.h>
+#include <err.h>
 #include <fcntl.h>
 #include <spawn.h>
 #include <sys/ptrace.h>
@@ -9,13 +10,14 @@
 #include <unistd.h>
 
 #include <algorithm>
+#include <cerrno>
 #include <chrono>
 #include <cstddef>
-#include <cstdio>
 #include <cstdlib>
 #include <filesystem>
 #include <fstream>
 #include <iomanip>
+#include <iostream>
 #include <limits>
 #include <sstream>
 #include <string>
@@ -89,11 +91,12 @@ double time_of(const char* path, boot kind) {
   pid_t child = 0;
   int status = 0;
   const auto start = std::chrono::steady_clock::now();
-  if (posix_spawn(&child, path, &actions, nullptr, arguments, environment) != 0) std::abort();
+  errno = posix_spawn(&child, path, &actions, nullptr, arguments, environment);
+  if (errno != 0) err(EXIT_FAILURE, "%s can't be started", path);
   waitpid(child, &status, 0);
   const std::chrono::duration<double> time = std::chrono::steady_clock::now() - start;
   posix_spawn_file_actions_destroy(&actions);
-  if (status != 0) std::abort();
+  if (status != 0) errx(EXIT_FAILURE, "%s has ended with wait status %d", path, status);
   return time.count();
 }
 
@@ -132,7 +135,7 @@ double median_of(std::vector<double> values) {
   return *middle;
 }
 
-void time_boots(benchmark::State& state, boot kind) {
+void time_boots(benchmark::State& state, const char* name, boot kind) {
   make_device(state.range(0), state.range(1));
   std::vector<double> times;
   std::vector<double> floor_times;
@@ -144,36 +147,53 @@ void time_boots(benchmark::State& state, boot kind) {
   const double time = median_of(times);
   const double floor_time = median_of(floor_times);
   const double memory = peak_memory_of(program, kind) - peak_memory_of(floor_program, kind);
-  constexpr double microseconds = 1e6;
-  // Plain numbers: the runner writes large counters as 2.49696k.
-  std::ostringstream label;
-  label << std::fixed << std::setprecision(0) << "floor " << floor_time * microseconds
-        << " us, olmboot " << time * microseconds << " us, ratio " << std::setprecision(2)
-        << time / floor_time << ", memory over the floor " << std::setprecision(0) << memory
-        << " KiB";
-  state.SetLabel(label.str());
+  constexpr double milliseconds = 1e3;
+  std::ostringstream row;
+  row << std::fixed << std::left << std::setw(18) << name << std::right << std::setw(10)
+      << state.range(0) << std::setw(10) << state.range(1) << std::setprecision(2) << std::setw(8)
+      << time * milliseconds << " ms" << std::setw(8) << floor_time * milliseconds << " ms"
+      << std::setw(7) << time / floor_time << std::setprecision(0) << std::setw(8) << memory
+      << " KiB";
+  state.SetLabel(row.str());
 }
+
+// Prints a row a series. The library's own reporters print other times, too.
+class table : public benchmark::BenchmarkReporter {
+ public:
+  bool ReportContext(const Context& /*context*/) override {
+    std::cout
+        << "boot               data sets ICU files    olmboot      floor  ratio more memory\n";
+    return true;
+  }
+  void ReportRuns(const std::vector<Run>& runs) override {
+    for (const auto& run : runs) std::cout << run.report_label << std::endl;
+  }
+};
 
 }  // namespace
 
+// With the argument `device`, only makes the device of the first row.
 int main(int argc, char** argv) {
   null_device = open("/dev/null", O_RDWR);
   proc = open("/proc", O_RDONLY | O_DIRECTORY);
   benchmark::Initialize(&argc, argv);
   benchmark::CPUInfo::Get();  // reads /sys, which the root doesn't have
   const char* const root = std::getenv("OLMBOOT_ROOT");
-  if (root == nullptr || chdir(root) != 0 || chroot(".") != 0 || !fs::exists("/throw-away")) {
-    (void)std::fputs("not in a throw-away root; use tools/bench\n", stderr);
-    return EXIT_FAILURE;
+  if (root == nullptr || chdir(root) != 0 || chroot(".") != 0 || !fs::exists("/throw-away"))
+    errx(EXIT_FAILURE, "not in a throw-away root; use tools/bench");
+  if (argc > 1) {
+    make_device(1, 1);
+    rewind(boot::update);
+    return EXIT_SUCCESS;
   }
-  const std::pair<const char*, boot> boots[] = {{"installs_an_update", boot::update},
-                                                {"nothing_new", boot::again}};
+  const std::pair<const char*, boot> boots[] = {{"installs an update", boot::update},
+                                                {"nothing new", boot::again}};
   for (const auto& [name, kind] : boots) {
-    auto* const series = benchmark::RegisterBenchmark(name, time_boots, kind);
-    series->ArgNames({"data_sets", "ICU_files"})->Iterations(500);
-    series->UseManualTime()->Unit(benchmark::kMicrosecond);
+    auto* const series = benchmark::RegisterBenchmark(name, time_boots, name, kind);
+    series->ArgNames({"data_sets", "ICU_files"})->Iterations(500)->UseManualTime();
     series->Args({1, 1})->Args({100, 1})->Args({10000, 1})->Args({1, 100})->Args({1, 10000});
   }
-  benchmark::RunSpecifiedBenchmarks();
+  table rows;
+  benchmark::RunSpecifiedBenchmarks(&rows);
   return EXIT_SUCCESS;
 }

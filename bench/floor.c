@@ -80,8 +80,8 @@ int main(int argc, char** argv) {
     unlink(STORAGE "icutz");
     unlink("/var/db/icutz");
     symlink(DOWNLOAD "/icutz", STORAGE "icutz");
-    int how = O_WRONLY | O_CREAT | O_NOFOLLOW | O_NONBLOCK | O_CLOEXEC;
-    int record = open(STORAGE "TZVersionDiffRecord", how, 0666);
+    int flags = O_WRONLY | O_CREAT | O_NOFOLLOW | O_NONBLOCK | O_CLOEXEC;
+    int record = open(STORAGE "TZVersionDiffRecord", flags, 0666);
     fstat(record, &status);
     ftruncate(record, 0);
     write(record, "2016b.1.0_2016c.1.0", 19);

@@ -67,6 +67,9 @@ void olm_icu::initialize() {
 
 std::string olm_icu::schema_of_data_file() const {
   const directory_walk walk = open_walk(directory);
+  // On 32 bit the C library's fts(3) reads by the narrow readdir(3), up to 2.36 at least. An entry
+  // whose inode number or place in the directory needs more than 32 bits then ends the walk without
+  // an error, as if there were no more.
   while (FTSENT* const entry = fts_read(walk.get())) {
     if (entry->fts_level == 0) continue;  // the directory itself
     // What lies deeper is never chosen, however much it is.

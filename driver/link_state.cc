@@ -20,7 +20,7 @@ std::string parse_zoneinfo_link(const std::string& link) {
     return {};
   }
   warn("Bad zoneinfo link %s", link.c_str());
-  throw no_error_number;
+  throw filesystem_error(no_error_number);
 }
 
 std::string read_current_path() {

@@ -1,15 +1,12 @@
 #include "driver/selection.h"
 
 #include <err.h>
-#include <fcntl.h>
-#include <sys/stat.h>
-#include <unistd.h>
 
 #include <string>
 
 #include "dataset/dataset.h"
 #include "driver/link_state.h"
-#include "util/paths.h"
+#include "driver/record.h"
 
 namespace {
 
@@ -24,27 +21,6 @@ std::string current_path_or_reset() {
     reset_to_system();
     return {};
   }
-}
-
-// Whether the open `file` has no other name. With one it may be anybody's.
-bool has_one_name(int file) {
-  struct stat status;
-  return fstat(file, &status) == 0 && status.st_nlink == 1;
-}
-
-// Replaces the record of the last update by `from`, "_" and `to`, without a line end. Not by a
-// stream: that would follow a link. A failure isn't reported: the update is installed all the same.
-void write_record(const std::string& from, const std::string& to) {
-  const std::string text = from + "_" + to;
-  constexpr mode_t permissions = 0666;  // less the umask
-  // O_NONBLOCK: a named pipe isn't waited for. If it has a reader, ftruncate(2) refuses it.
-  constexpr int how = O_WRONLY | O_CREAT | O_NOFOLLOW | O_NONBLOCK | O_CLOEXEC;
-  const int file = open(paths::record, how, permissions);
-  if (file == -1) return;
-  if (has_one_name(file) && ftruncate(file, 0) == 0) {
-    [[maybe_unused]] const ssize_t written = write(file, text.data(), text.size());
-  }
-  close(file);
 }
 
 void select_and_install_or_throw() {

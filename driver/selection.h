@@ -6,8 +6,6 @@
 // recorded if it is compatible with the system data set and newer than the current one. Links that
 // name no data set are reset, and the decision goes on with the system data set as the current one;
 // any other error ends it with a reset.
-// The record is written only into a regular file that has no other name, and never through a link.
-// One that can't be written is no error.
 // Prints, besides the lines of what it calls,
 //   "Invalid current symlinks; resetting to system partition"
 //   "Symlink points at data incompatible with installed system"

@@ -24,13 +24,11 @@ int olmboot_main();
 namespace fs = std::filesystem;
 using std::string;
 
-// Faults on demand. faults.cc stands in for these functions of the whole program: read, symlink,
-// write, operator new, and warn, which never fails.
+// Faults on demand. faults.cc stands in for these functions of the whole program: read, stat,
+// symlink, write, operator new, and warn, which never fails.
 struct fault {
-  string call;    // whose calls fail; none's if empty
-  int error = 0;  // the error number; operator new throws std::bad_alloc instead
-  int first = 1;  // which of its calls fails, counted from 1
-  int seen = 0;   // how many of its calls there were
+  const char* call = nullptr;  // whose calls are counted, if any
+  int nth = 1;                 // which of its calls fails; counted down
 };
 inline fault planned_fault;
 
@@ -46,7 +44,8 @@ inline int last_warned_error;  // the error number that warn was to tell
 class device : public ::testing::Test {
  protected:
   using state = std::map<string, string>;  // what stands at each path
-  static constexpr int no_fault = 77;      // a status: no call failed as planned
+  // What boot() returns besides the program's statuses. no_fault: the planned one didn't happen.
+  enum { no_fault = 77, standard_output_used, wrong_signals_ignored, descriptor_left_open };
 
   device() {
     std::signal(SIGPIPE, SIG_IGN);
@@ -59,20 +58,20 @@ class device : public ::testing::Test {
     std::memset(printed, 0, printed_size);
   }
   ~device() override {
-    if (fchdir(machine) != 0 || chroot(".") != 0) std::abort();
+    if (fchdir(outside) != 0 || chroot(".") != 0) std::abort();
     fs::remove_all(root);
   }
 
-  static string full(const string& lines) {
+  static string expand(const string& lines) {
     return std::regex_replace(lines, std::regex("~/"), "/var/db/timezone/");
   }
 
   static void put(const string& lines) {
-    std::istringstream stream(full(lines));
+    std::istringstream stream(expand(lines));
     for (string path, what; stream >> path && std::getline(stream >> std::ws, what);) {
       fs::remove_all(path);
       fs::create_directories(fs::path(path).parent_path());
-      if (what == "(pipe)") mkfifo(path.c_str(), S_IRUSR | S_IWUSR | S_IRGRP | S_IROTH);
+      if (what == "(pipe)") mkfifo(path.c_str(), 0664);
       if (what == "(directory)") fs::create_directory(path);
       if (what[0] == '&') fs::create_hard_link(what.substr(2), path);
       if (what[0] == '-') fs::create_symlink(what.substr(3), path);
@@ -83,11 +82,15 @@ class device : public ::testing::Test {
   static state look() {
     state found;
     for (const auto& entry : fs::recursive_directory_iterator("/")) {
+      struct stat status = {};
+      lstat(entry.path().c_str(), &status);
       string& what = found[entry.path()] = "(directory or pipe)";
       if (entry.is_symlink()) what = "-> " + fs::read_symlink(entry).string();
-      if (entry.symlink_status().type() != fs::file_type::regular) continue;
-      what = "= " + (std::ostringstream() << std::ifstream(entry.path()).rdbuf()).str();
-      if (entry.status().permissions() != fs::perms{0664}) what += " (not the mode of a new file)";
+      if (S_ISREG(status.st_mode))
+        what = "= " + (std::ostringstream() << std::ifstream(entry.path()).rdbuf()).str();
+      const mode_t mode = entry.is_symlink() ? 0777 : S_ISDIR(status.st_mode) ? 0775 : 0664;
+      if ((status.st_mode & 0777) != mode || status.st_uid != geteuid())
+        what += " (not the mode or the owner of a new one)";
     }
     return found;
   }
@@ -102,27 +105,32 @@ class device : public ::testing::Test {
     return changes;
   }
 
-  // Runs the program in a child. Returns its status, no_fault, or 128 and the signal that ended it.
+  // Runs the program in a child. Returns its status, 128 and the signal that ended it, or one of
+  // the above. noexcept: an exception that escapes the program ends the child, too. GoogleTest
+  // would take it for the test's, and go on with the other tests there.
   static int boot(const fault& plan = {}) noexcept {
     std::memset(printed, 0, printed_size);
     std::fflush(stdout);
     if (fork() == 0) {
       alarm(150);  // for a run that hangs
       std::signal(SIGPIPE, SIG_DFL);
-      dup2(machine, STDOUT_FILENO);  // where nothing can be written
+      dup2(outside, STDOUT_FILENO);  // where nothing can be written
       close(STDIN_FILENO);           // so that it is the next to be opened
       planned_fault = plan;
       const int status = olmboot_main();
-      if (std::fflush(stdout) + std::raise(SIGXFSZ) != 0) std::abort();
-      if (dup(STDERR_FILENO) != STDIN_FILENO) std::abort();  // a descriptor is left open
-      _exit(plan.call.empty() || planned_fault.seen >= plan.first ? status : no_fault);
+      if (plan.call != nullptr && planned_fault.nth > 0) _exit(no_fault);
+      if (std::fflush(stdout) != 0) _exit(standard_output_used);
+      if (std::signal(SIGXFSZ, SIG_DFL) != SIG_IGN || std::signal(SIGTERM, SIG_DFL) != SIG_DFL)
+        _exit(wrong_signals_ignored);
+      if (dup(STDERR_FILENO) != STDIN_FILENO) _exit(descriptor_left_open);
+      _exit(status);
     }
     int status = 0;
     wait(&status);
     return WIFEXITED(status) ? WEXITSTATUS(status) : 128 + WTERMSIG(status);
   }
 
-  static inline const int machine = open("/", O_RDONLY | O_CLOEXEC);  // outside the device
+  static inline const int outside = open("/", O_RDONLY | O_CLOEXEC);  // outside the device
 
  private:
   string root = fs::canonical(fs::temp_directory_path()) / "olmboot_tests.XXXXXX";

@@ -7,15 +7,21 @@
 #include "device.h"
 
 static bool fails(const char* call) {
-  if (planned_fault.call != call) return false;
-  const int seen = ++planned_fault.seen;
-  errno = planned_fault.error;  // of no use if the call succeeds
-  return seen == planned_fault.first;
+  if (planned_fault.call == nullptr || std::strcmp(planned_fault.call, call) != 0) return false;
+  errno = EIO;  // of no use if the call succeeds
+  return --planned_fault.nth == 0;
 }
 
 // The file streams of libstdc++ call it, those of libc++ don't.
 ssize_t read(int descriptor, void* buffer, std::size_t size) {
   return fails("read") ? -1 : syscall(SYS_read, descriptor, buffer, size);
+}
+
+// As if a larger file took the place of the one at the path at once.
+int stat(const char* path, struct stat* status) noexcept {
+  const int result = fstatat(AT_FDCWD, path, status, 0);
+  if (fails("stat")) status->st_size = 2;
+  return result;
 }
 
 int symlink(const char* target, const char* path) noexcept {

@@ -3,16 +3,15 @@
 
 import argparse
 import collections
-import itertools
 import multiprocessing.pool
 import os
-import queue
 import re
 import shutil
 import signal
 import subprocess
 import sys
 import tempfile
+import threading
 
 STORAGE = "/var/db/timezone/"
 ZONEINFO, ICUTZ, LOCALTIME, LATEST, RECORD = (
@@ -30,11 +29,12 @@ ERRORS = ("EIO", "EACCES", "ENOSPC", "EROFS", "ENOMEM", "EMFILE", "EINTR")
 # What a call can fail with, where that isn't each of these.
 POSSIBLE = {"brk": ("ENOMEM",), "mmap": ("ENOMEM",), "munmap": ("ENOMEM",), "rt_sigaction": (),
             "futex": (), "exit_group": ()}
-TIME_LIMIT = 20  # seconds
+TIME_LIMIT = "20"  # seconds
 
-# A whole line of warn(3).
+# A whole line of warn(3), and a primitive's, whose cause the next line repeats.
 WARNING = re.compile("olmboot: .+: (%s)" % "|".join(
     re.escape(text) for text in {os.strerror(number) for number in range(134)}))
+PRIMITIVE = re.compile("olmboot: (read_symlink|remove|create_symlink): ")
 
 
 def active(data_set):
@@ -56,15 +56,20 @@ COMMON = {
     LOCALTIME: f"-> {ZONEINFO}/Europe/Paris",
 }
 UPDATED = {**COMMON, **active(DOWNLOAD), RECORD: "2016b.1.0_2016c.1.0"}
+# What stands on the device before a boot, and what the boot must make of it.
 BOOTS = {
-    "new device": {path: what for path, what in COMMON.items()
-                   if not path.startswith(STORAGE)} | {STORAGE + "tz/none": ""},
-    "update": {**COMMON, ZONEINFO: ON_SYSTEM},
-    "newer download": {**COMMON, **active(OLDER_DOWNLOAD), RECORD: "2016b.1.0_2016b.2.0"},
-    "nothing new": UPDATED,
-    "system upgrade": {**UPDATED, SYSTEM_TREE + "/+VERSION": "2016d\n"},
-    "older entries": {**UPDATED, ICUTZ: ABSENT, OLD_ICUTZ: f"-> {DOWNLOAD}/icutz", OLD_ICU: "",
-                      LOCALTIME: "-> /usr/share/zoneinfo/Europe/Paris"},
+    "new device": ({path: what for path, what in COMMON.items() if not path.startswith(STORAGE)}
+                   | {STORAGE + "tz/none": ""}, {ZONEINFO: ON_SYSTEM}),
+    "update": ({**COMMON, ZONEINFO: ON_SYSTEM}, UPDATED),
+    "newer download": ({**COMMON, **active(OLDER_DOWNLOAD), RECORD: "2016b.1.0_2016b.2.0"},
+                       {**UPDATED, RECORD: "2016b.2.0_2016c.1.0"}),
+    "nothing new": (UPDATED, UPDATED),
+    "system upgrade": ({**UPDATED, SYSTEM_TREE + "/+VERSION": "2016d\n"},
+                       {ZONEINFO: ON_SYSTEM, ICUTZ: ABSENT}),
+    "older entries": (
+        {**UPDATED, ICUTZ: ABSENT, OLD_ICUTZ: f"-> {DOWNLOAD}/icutz", OLD_ICU: "",
+         LOCALTIME: "-> /usr/share/zoneinfo/Europe/Paris"},
+        {**UPDATED, OLD_ICUTZ: ABSENT, OLD_ICU: ABSENT}),
 }
 
 
@@ -107,28 +112,23 @@ class Device:
 
     def boot(self, *injection):
         """Runs the program. Returns its status, a signal's negated, and the lines that it printed;
-        one on standard output says so. Ends it at the time limit, with the status None."""
+        one on standard output says so. Kills it at the time limit."""
         command = ["setarch", "-R", "chroot", self.root, "/sbin/olmboot"]
         if injection:
             command = ["strace", "-o", self.trace_file, *injection, *command]
-        with subprocess.Popen(command, stdout=subprocess.PIPE, stderr=subprocess.PIPE,
-                              start_new_session=True) as run:
-            try:
-                output, lines = run.communicate(timeout=TIME_LIMIT)
-            except subprocess.TimeoutExpired:
-                os.killpg(run.pid, signal.SIGKILL)  # strace and the program
-                return None, []
+        run = subprocess.run(["timeout", "-s", "KILL", TIME_LIMIT, *command],
+                             capture_output=True, check=False, text=True)
         # strace has a word to say about an address that 32 bits don't hold.
         return run.returncode, [
-            line for line in lines.decode().splitlines() if not line.startswith("strace: ")
-        ] + ["on standard output: " + line for line in output.decode().splitlines()]
+            line for line in run.stderr.splitlines() if not line.startswith("strace: ")
+        ] + ["on standard output: " + line for line in run.stdout.splitlines()]
 
     def trace(self):
         with open(self.trace_file, encoding="utf-8") as file:
             return file.read().splitlines()
 
 
-Call = collections.namedtuple("Call", "name line injection")  # injection: of a fault, by its name
+Call = collections.namedtuple("Call", "number name line injection")  # the last: of each fault
 
 
 def calls_of(device, start):
@@ -147,7 +147,7 @@ def calls_of(device, start):
             if name == "brk":
                 faults["ENOMEM"] = inject.format("retval=" + old_end)  # that is how it fails
             faults["kill"] = inject.format("signal=SIGKILL")
-            calls.append(Call(name, line, faults))
+            calls.append(Call(len(calls) + 1, name, line, faults))
         else:
             early = [] if name == "execve" else early + re.findall('"/(?:usr|var)/[^"]*"', line)
         if name == "brk":
@@ -213,9 +213,10 @@ class Run:
         if not self.call.line.startswith("write(2,"):
             self.violations += [f"this line is not a warning: {line}" for line in self.lines
                                 if not WARNING.fullmatch(line)]
-        if self.status is None:
-            self.violations.append(f"no end after {TIME_LIMIT} s")
-        elif self.status == 1 and re.match(f'symlink.*"{LOCALTIME}"', self.call.line):
+            for line, later in zip(self.lines, self.lines[1:]):
+                if PRIMITIVE.match(line) and not later.endswith(line.split(": ")[-1]):
+                    self.violations.append(f"another cause than in the line before: {later}")
+        if self.status == 1 and re.match(f'symlink.*"{LOCALTIME}"', self.call.line):
             self.exceptions.append("status 1")
         elif self.status != 0:
             self.violations.append(f"status {self.status}")
@@ -252,47 +253,56 @@ class Run:
             for path in sorted(earlier.keys() | later.keys()):
                 if earlier.get(path) != later.get(path):
                     print(f"{title}: {path} {later.get(path, ABSENT)}")
-        for title, texts in (("exception", self.exceptions), ("violation", self.violations)):
-            print(*(f"{title}: {text}" for text in texts), sep="\n", end="\n" if texts else "")
 
 
 class Boot:
     """A boot of the device `start`: its calls, and what one and two undisturbed runs leave."""
 
     def __init__(self, device, name):
-        self.name, self.start = name, BOOTS[name]
+        self.name, (self.start, purpose) = name, BOOTS[name]
         self.calls = calls_of(device, self.start)
         device.put(self.start)
         self.before = device.look()
         device.boot()
+        once = device.look()
+        for path, what in purpose.items():
+            if once.get(path, ABSENT) != what:
+                sys.exit(f"faults: the boot '{name}' leaves {path} {once.get(path, ABSENT)!r}")
         device.boot()
         self.after = device.look()
 
 
-def make_every_fault(name):
-    """Makes every fault of one boot happen, prints its row, and returns its violations."""
-    boot = Boot(Device(), name)
-    faults = [(n, fault) for n, call in enumerate(boot.calls) for fault in call.injection]
-    devices = queue.SimpleQueue()
-    for _ in range(os.cpu_count()):
-        devices.put(Device())
+def make_faults(options, name):
+    """Makes those faults of a boot happen that the options choose. Prints the boot's row and its
+    violations, and returns its runs."""
+    boot, runs, local = Boot(Device(), name), [], threading.local()
+    faults = [(call, fault) for call in boot.calls for fault in call.injection
+              if options.call in (None, call.number) and options.fault in (None, fault)]
 
-    def work(at):
-        device = devices.get()
-        run = Run(device, boot, boot.calls[at[0]], at[1])
-        devices.put(device)
-        return run
+    def work(fault):
+        if not hasattr(local, "device"):
+            local.device = Device()
+        return Run(local.device, boot, *fault)
 
     with multiprocessing.pool.ThreadPool(os.cpu_count()) as pool:
-        runs = pool.map(work, faults)
-    exceptions = collections.Counter(itertools.chain(*(run.exceptions for run in runs)))
-    violations = [
-        f"{violation}; see it: tools/faults --boot '{name}' --call {n + 1} --fault {fault}"
-        for (n, fault), run in zip(faults, runs) for violation in run.violations]
-    row = ", ".join(f"{exception} {count}" for exception, count in sorted(exceptions.items()))
-    print(f"{name:15} {len(boot.calls):5} {len(faults) - len(boot.calls):6} {len(boot.calls):5} "
-          f"{len(violations):10}  {row}", flush=True)
-    return violations
+        for run in pool.imap(work, faults):
+            runs.append(run)
+            if sys.stdout.isatty():
+                print(f"{name}: {len(runs)} of {len(faults)} runs", end="\r", flush=True)
+    print_row(name, runs)
+    for run in runs:
+        for violation in run.violations:
+            print(f"  {violation}\n    tools/faults --boot '{name}' --call {run.call.number} "
+                  f"--fault {run.fault}")
+        if options.call:
+            run.show()
+    return runs
+
+
+def print_row(name, runs):
+    kills = sum(run.fault == "kill" for run in runs)
+    wrong = sum(len(run.violations) for run in runs)
+    print(f"{name:24}{len(runs):10,}{len(runs) - kills:10,}{kills:10,}{wrong:12,}", flush=True)
 
 
 def main():
@@ -301,34 +311,23 @@ def main():
     parser.add_argument("--call", type=int)
     parser.add_argument("--fault", choices=(*ERRORS, "kill"))
     options = parser.parse_args()
-    if (options.call is None) != (options.fault is None) or options.fault and not options.boot:
-        parser.error("--call and --fault go together, with --boot")
     if "OLMBOOT_PROGRAM" not in os.environ:
         return 0  # asked about the arguments alone
-    if options.call is not None:
-        device = Device()
-        boot = Boot(device, options.boot)
-        if not 1 <= options.call <= len(boot.calls):
-            parser.error(f"the boot has the calls 1 to {len(boot.calls)}")
-        call = boot.calls[options.call - 1]
-        if options.fault not in call.injection:
-            parser.error(f"this call has the faults {', '.join(call.injection)}: {call.line}")
-        run = Run(device, boot, call, options.fault)
-        run.show()
-        return 1 if run.violations else 0
-    print("boot            calls faults kills violations  exceptions")
-    violations = []
+    print("boot                          runs    errors     kills  violations")
+    runs = []
     for name in [options.boot] if options.boot else BOOTS:
-        violations += make_every_fault(name)
-    for violation in violations:
-        print(violation)
-    print("olmboot(8) explains the exceptions: status 1 under EXIT STATUS, others under CAVEATS.")
-    print(f"{len(violations)} violations")
-    return 1 if violations else 0
+        runs += make_faults(options, name)
+    if not runs:
+        parser.error("no boot has that call and fault")
+    print_row("all", runs)
+    print("olmboot(8) explains under EXIT STATUS or CAVEATS what these runs left:")
+    exceptions = collections.Counter(name for run in runs for name in run.exceptions)
+    for exception, count in sorted(exceptions.items()):
+        print(f"{exception:24}{count:10,}")
+    return 1 if any(run.violations for run in runs) else 0
 
 
 if __name__ == "__main__":
-    try:
-        sys.exit(main())
-    except KeyboardInterrupt:
-        os._exit(130)
+    for ending in (signal.SIGINT, signal.SIGPIPE):
+        signal.signal(ending, signal.SIG_DFL)  # at once, without a traceback
+    sys.exit(main())
