@@ -1,5 +1,5 @@
-# Real time zone data for the commands in this folder: this machine's own, and data compiled from it
-# with one rule changed. To be sourced after common.sh.
+# Real time zone data for the commands in this folder: this machine's own, and data compiled from it with
+# one rule changed. And the commands of the manual pages. To be sourced after common.sh.
 # shellcheck shell=bash disable=SC2034,SC2154
 
 machine_tree=/usr/share/zoneinfo
@@ -40,4 +40,19 @@ compile_icu() {
     echo zoneinfo64.res >"$TMPDIR/list.txt"
     icupkg -s "$1" -a "$TMPDIR/list.txt" new "$1/icutz$3.dat"
   }
+}
+
+# example PAGE TEXT: prints the page's first example in which TEXT stands, as a terminal of 80 columns shows
+# it.
+example() {
+  mandoc -T ascii -O width=80 "$project/man/$1.in" | sed 's/.\x08//g' |
+    awk -v text="$2" -v RS= '/^           / && index($0, text) && !found++' | grep . ||
+    fail "$1 has no example with '$2'"
+}
+
+# Does the example of olmboot-image(7) in which $2 stands, for the image $1.
+in_image() {
+  local commands
+  commands=$(example olmboot-image.7 "$2")
+  (export IMAGE=$1 && eval "$commands")
 }
