@@ -3,9 +3,9 @@
 #include <string>
 
 // Returns the first word of the regular file at `path`, through links: white space is skipped, then
-// everything up to the next white space is taken, however long. Of a file that a larger one replaces
-// meanwhile, no more is taken than the first would hold. Returns the empty string when there is no
-// word: the file is missing or blank, or a read fails.
+// everything up to the next white space is taken, however long. If a larger file takes the place of
+// the one that was looked at, no more is taken than that one would hold. Returns the empty string
+// when there is no word: the file is missing or blank, or a read fails.
 // Only a regular file of 1 byte to 16 MiB is opened. A pipe or a device may never come to an end.
 // Nor may some files of the kernel, which tell the size 0. A file of many GiB can take no room on
 // the disk, but would in memory.
