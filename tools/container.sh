@@ -15,7 +15,7 @@ make_device() {
   device=$TMPDIR/device
   quietly "Making a Debian system" mmdebstrap --variant=minbase \
     --include=dbus,systemd,systemd-sysv,tzdata \
-    "$(. /etc/os-release && echo "$VERSION_CODENAME")" "$device" || fail "$(tail -n 1 "$log")"
+    "$(. /etc/os-release && echo "$VERSION_CODENAME")" "$device" || fail "$(grep -m 1 ^E: "$log")"
   mkdir -p "$device/etc/systemd/system/graphical.target.wants"
   cat >"$device/etc/systemd/system/check.service" <<'UNIT'
 [Unit]
