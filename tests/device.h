@@ -45,7 +45,7 @@ class device : public ::testing::Test {
  protected:
   using state = std::map<string, string>;  // what stands at each path
   // What boot() returns besides the program's statuses. no_fault: the planned one didn't happen.
-  enum { no_fault = 77, standard_output_used, wrong_signals_ignored, descriptor_left_open };
+  enum { no_fault = 77, standard_output_used, wrong_signals, descriptor_left_open };
 
   device() {
     std::signal(SIGPIPE, SIG_IGN);
@@ -120,8 +120,9 @@ class device : public ::testing::Test {
       const int status = olmboot_main();
       if (plan.call != nullptr && planned_fault.nth > 0) _exit(no_fault);
       if (std::fflush(stdout) != 0) _exit(standard_output_used);
-      if (std::signal(SIGXFSZ, SIG_DFL) != SIG_IGN || std::signal(SIGTERM, SIG_DFL) != SIG_DFL)
-        _exit(wrong_signals_ignored);
+      if (std::signal(SIGXFSZ, SIG_DFL) != SIG_IGN || std::signal(SIGTERM, SIG_DFL) != SIG_DFL ||
+          alarm(0) < 100)
+        _exit(wrong_signals);
       if (dup(STDERR_FILENO) != STDIN_FILENO) _exit(descriptor_left_open);
       _exit(status);
     }
