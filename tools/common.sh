@@ -28,32 +28,26 @@ case ${1-} in
 esac
 [ $# = 0 ] || [[ $usage == *' '* ]] || refuse "unknown argument '$1'"
 
-# What is named here is removed when the command ends, however it ends.
-remove_at_end=()
-trap '[ ${#remove_at_end[@]} = 0 ] || rm -rf "${remove_at_end[@]}"' EXIT
-trap 'exit 129' HUP
-trap 'exit 130' INT
-trap 'exit 143' TERM
-
-# All that a command and what it starts leaves in the temporary directory goes with it.
+# All that a command and what it starts leaves in the temporary directory goes when it ends, however it
+# ends.
 given=${TMPDIR:-/tmp}
-if ! TMPDIR=$(mktemp -d 2>/dev/null) || ! head -c 1000000 /dev/zero 2>/dev/null >"$TMPDIR/room"; then
-  rm -rf "$TMPDIR"
-  fail "the temporary directory $given is missing or full; name another one in TMPDIR"
-fi
-rm "$TMPDIR/room"
-remove_at_end+=("$TMPDIR")
+TMPDIR=$(mktemp -d) || fail "name another temporary directory in TMPDIR"
+trap 'rm -rf "$TMPDIR"' EXIT
+trap 'exit 130' HUP INT TERM
 export TMPDIR
 log=$TMPDIR/log # of what is quiet
 
 # quietly WHAT COMMAND...: says WHAT, runs the command with its output in $log, and says how long it took.
-# Returns the command's status.
+# If it fails, shows the end of the output, without what went well, and ends this command.
 quietly() {
-  local start=$SECONDS status=0
+  local start=$SECONDS
   printf '%s ... ' "$1"
-  "${@:2}" >"$log" 2>&1 </dev/null || status=$?
-  if [ $status = 0 ]; then echo "$((SECONDS - start)) s"; else echo failed; fi
-  return $status
+  if ! "${@:2}" >"$log" 2>&1 </dev/null; then
+    echo
+    grep -vE '^(-- |\[ *[0-9]+%\] | +Start|.* Passed  |[0-9]+ warnings? .*generated)' "$log" | tail -n 40 >&2
+    fail "this failed: $1"
+  fi
+  echo "$((SECONDS - start)) s"
 }
 
 # Installs those of the given Debian packages that are missing, or says what to do where it can't. On
@@ -76,8 +70,7 @@ need_packages() {
     as_root=(sudo)
   fi
   quietly "Installing ${missing[*]}" "${as_root[@]}" sh -c 'apt-get update -qq &&
-    DEBIAN_FRONTEND=noninteractive apt-get install -y -qq --no-install-recommends "$@"' - "${missing[@]}" ||
-    fail "apt-get: $(tail -n 1 "$log")"
+    DEBIAN_FRONTEND=noninteractive apt-get install -y -qq --no-install-recommends "$@"' - "${missing[@]}"
 }
 
 # Runs a command as root: of the machine, or of a user namespace.
@@ -92,35 +85,20 @@ need_root() {
     fail "this user can't enter a throw-away root; run as root, or outside of any chroot with user namespaces"
 }
 
-# Makes the build folder.
-need_build_folder() {
-  if ! { mkdir -p "$build" && : >>"$build/lock"; } 2>/dev/null; then
-    fail "$build can't be written; name another folder in OLMBOOT_BUILD"
-  fi
-}
-
 configure_and_build() {
   (cd "$project" && cmake --preset "$1" -B "$build/$1" && cmake --build "$build/$1" -j "$(nproc)")
 }
 
-# Configures and builds the preset $1 in $build/$1, without what was set there before. Shows the output
-# only when that fails, and warnings always. One command builds at a time.
+# Configures and builds the preset $1 in $build/$1, without what was set there before. Shows warnings. One
+# command builds at a time.
 build_preset() {
-  need_build_folder
+  mkdir -p "$build" || fail "name another build folder in OLMBOOT_BUILD"
   exec 9>"$build/lock"
-  if ! flock -n 9; then
-    echo "Another command is building; waiting for it."
-    flock 9
-  fi
+  flock 9
   # --fresh would build everything again, too.
   rm -f "$build/$1/CMakeCache.txt"
-  if quietly "Building preset '$1'" configure_and_build "$1"; then
-    grep -A 3 'warning:' "$log" || true
-  else
-    # Without what went well, and clang-tidy's count of what it found in the system's headers.
-    grep -vE '^(-- |\[ *[0-9]+%\] |[0-9]+ warnings?( and [0-9]+ errors?)? generated)' "$log" >&2 || true
-    fail "the build of preset '$1' failed"
-  fi
+  quietly "Building preset '$1'" configure_and_build "$1"
+  grep -A 3 'warning:' "$log" || true
   exec 9>&-
 }
 
@@ -132,8 +110,7 @@ build_package() {
   mkdir -p "$folder/olmboot"
   tar c -C "$project" --exclude=./.git --exclude=./build . | tar x -C "$folder/olmboot"
   quietly "Building the package for $architecture" env --chdir="$folder/olmboot" \
-    dpkg-buildpackage -us -uc -Pnocheck "-a$architecture" ||
-    { cat "$log" >&2 && fail "the build of the package failed"; }
+    dpkg-buildpackage -us -uc -Pnocheck "-a$architecture"
   package=$(echo "$folder"/olmboot_*.deb)
 }
 
