@@ -26,8 +26,8 @@ compile_tree() {
   echo "$2" >"$1/+VERSION"
 }
 
-# Compiles ICU's rules, changed in the same way, into the directory $1, as release $2. If there is $3,
-# packs them as the data file of that format, too.
+# Compiles ICU's rules, changed in the same way, into the directory $1, as release $2. If there is $3, adds
+# a data file of that format.
 compile_icu() {
   local text=$TMPDIR/zoneinfo64.txt
   mkdir -p "$1"
@@ -36,10 +36,7 @@ compile_icu() {
     -e "s/TZVersion { \".*\" }/TZVersion { \"$2\" }/" >"$text"
   grep -q "$changed_icu_rule" "$text" || fail "the rule to be changed is not in ICU's data"
   genrb -q -d "$1" "$text"
-  [ $# -lt 3 ] || {
-    echo zoneinfo64.res >"$TMPDIR/list.txt"
-    icupkg -s "$1" -a "$TMPDIR/list.txt" new "$1/icutz$3.dat"
-  }
+  [ $# -lt 3 ] || : >"$1/icutz$3.dat"
 }
 
 # example PAGE TEXT: prints the page's first example in which TEXT stands, as a terminal of 80 columns shows

@@ -5,6 +5,7 @@ import argparse
 import collections
 import multiprocessing.pool
 import os
+import pathlib
 import re
 import shutil
 import signal
@@ -77,38 +78,28 @@ class Device:
     """A throw-away root with the program in it."""
 
     def __init__(self):
-        self.root = tempfile.mkdtemp()
-        os.mkdir(self.root + "/sbin")
-        shutil.copy(os.environ["OLMBOOT_PROGRAM"], self.root + "/sbin/olmboot")
-        self.trace_file = self.root + "/trace"
+        self.root = pathlib.Path(tempfile.mkdtemp())
+        (self.root / "sbin").mkdir()
+        shutil.copy(os.environ["OLMBOOT_PROGRAM"], self.root / "sbin/olmboot")
+        self.trace_file = self.root / "trace"
 
     def put(self, entries):
-        for top in ("/usr", "/var"):
-            shutil.rmtree(self.root + top, ignore_errors=True)
-        for path, what in entries.items():
-            if what == ABSENT:
-                continue
-            os.makedirs(os.path.dirname(self.root + path), exist_ok=True)
+        for top in ("usr", "var"):
+            shutil.rmtree(self.root / top, ignore_errors=True)
+        for name, what in entries.items():
+            path = self.root / name[1:]
+            if what != ABSENT:
+                path.parent.mkdir(parents=True, exist_ok=True)
             if what.startswith("-> "):
-                os.symlink(what[3:], self.root + path)
-            else:
-                with open(self.root + path, "w", encoding="ascii") as file:
-                    file.write(what)
+                path.symlink_to(what[3:])
+            elif what != ABSENT:
+                path.write_text(what)
 
     def look(self):
-        found = {}
-        for top in ("/usr", "/var"):
-            for directory, names, files in os.walk(self.root + top):
-                for path in (os.path.join(directory, name) for name in names + files):
-                    if os.path.islink(path):
-                        what = "-> " + os.readlink(path)
-                    elif os.path.isdir(path):
-                        what = "(directory)"
-                    else:
-                        with open(path, encoding="ascii") as file:
-                            what = file.read()
-                    found[path[len(self.root):]] = what
-        return found
+        return {f"/{path.relative_to(self.root)}":
+                f"-> {os.readlink(path)}" if path.is_symlink() else
+                "(directory)" if path.is_dir() else path.read_text()
+                for path in self.root.glob("[uv]*/**/*")}
 
     def boot(self, *injection):
         """Runs the program. Returns its status, a signal's negated, and the lines that it printed;
@@ -124,8 +115,7 @@ class Device:
         ] + ["on standard output: " + line for line in run.stdout.splitlines()]
 
     def trace(self):
-        with open(self.trace_file, encoding="utf-8") as file:
-            return file.read().splitlines()
+        return self.trace_file.read_text().splitlines()
 
 
 Call = collections.namedtuple("Call", "number name line injection")  # the last: of each fault
