@@ -37,7 +37,7 @@ TEST_F(units_test, near_misses_are_no_versions) {
 TEST_F(units_test, only_the_text_of_a_zoneinfo_link_counts) {
   EXPECT_EQ(parse_zoneinfo_link(downloads + "x/zoneinfo"), downloads + "x");
   EXPECT_EQ(parse_zoneinfo_link(downloads + "repeated//slashes"), downloads + "repeated/");
-  for (const auto* text : {"/usr/share/zoneinfo", "/usr/share/zoneinfo.default/",
+  for (const auto* text : {"tz/x/zoneinfo", "/usr/share/zoneinfo", "/usr/share/zoneinfo.default/",
                            "/var/db/timezone/tz/x", "/var/db/timezone/tz//zoneinfo",
                            "/var/db/timezone/tz-x/zoneinfo", "/mnt/var/db/timezone/tz/x/zoneinfo"})
     EXPECT_THROW(parse_zoneinfo_link(text), filesystem_error) << text;
