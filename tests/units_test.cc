@@ -47,6 +47,7 @@ TEST_F(units_test, an_error_is_told_and_stays_the_error_number) {
   put("/file = text\n");
   EXPECT_THROW(primitive::remove("/file/child"), filesystem_error);
   EXPECT_TRUE(errno == ENOTDIR && last_warned_error == ENOTDIR);
+  EXPECT_THROW(primitive::read_symlink("/file/child"), filesystem_error);
   EXPECT_THROW(primitive::read_symlink("/file"), filesystem_error);
   EXPECT_TRUE(errno == EINVAL && last_warned_error == EINVAL);
   EXPECT_THROW(primitive::create_symlink("/none", "/file"), filesystem_error);

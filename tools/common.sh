@@ -7,8 +7,11 @@ umask 022
 project=$(dirname "$(dirname "$(readlink -f "${BASH_SOURCE[0]}")")")
 build=$(realpath -m "${OLMBOOT_BUILD:-$project/build}")
 
+red='' plain=''
+if [ -t 1 ] && [ -z "${NO_COLOR-}" ] && [ "${TERM-dumb}" != dumb ]; then red=$'\e[31m' plain=$'\e[m'; fi
+
 fail() {
-  printf '%s: %s\n' "$(basename "$0")" "$1" >&2
+  printf '%s: %s\n' "$red$(basename "$0")$plain" "$1" >&2
   exit 1
 }
 
