@@ -103,8 +103,8 @@ const boot_case cases[] = {
     {"zone_link_to_the_system_tree", "~/localtime -> /usr/share/zoneinfo.default/Asia/Tokyo\n",
      correcting("~/zoneinfo.default/Asia/Tokyo") + zone_reset, default_zone},
     {"bad_zoneinfo_link_and_dangling_old_ICU_link",
-     "~/zoneinfo -> tz/2016c/%s%n\n/var/db/icutz -> /none\n" + newest_2016c, bad_link("tz/2016c/%s%n") + invalid,
-     "/var/db/icutz (absent)\n" + updated},
+     "~/zoneinfo -> tz/2016c/%s%n\n/var/db/icutz -> /none\n" + newest_2016c,
+     bad_link("tz/2016c/%s%n") + invalid, "/var/db/icutz (absent)\n" + updated},
     {"bad_version_and_latest_link_and_dangling_ICU_link",
      version + "%s%n\n~/icutz -> /none\n~/tz_latest -> ~/tz-%s%n\n~/zoneinfo -> ~/tz/2016e/\n",
      unparsed("%s%n.1.0") + incompatible + unparsed("%s%n.1.0") + bad_path("~/tz-%s%n") + unable +
