@@ -59,7 +59,7 @@ const boot_case cases[] = {
     {"new_device", "~/zoneinfo (absent)\n~/localtime (absent)\n",
      bad_link("") + invalid + zone_reset, default_zone + on_system},
     {"update", newest_2016c, "", updated},
-    {"newer_download", version + "2015a\n" + on_2016a + newest_2016c + record + "a longer text\n",
+    {"newer_download", version + "999a\n" + on_2016a + newest_2016c + record + "a longer text\n",
      "", record + "2016a_2016c\n" + on_2016c},
     {"nothing_new", newest_2016c + updated, refused("2016c", "2016c")},
     {"system_upgrade", version + "2017a\n" + on_2016c, incompatible, no_icutz + on_system},

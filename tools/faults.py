@@ -301,8 +301,9 @@ def main():
     if not runs:
         parser.error("no boot has that call and fault")
     print_row("all", runs)
-    print("olmboot(8) explains under EXIT STATUS or CAVEATS what these runs left:")
     exceptions = collections.Counter(name for run in runs for name in run.exceptions)
+    if exceptions:
+        print("olmboot(8) explains under EXIT STATUS or CAVEATS what these runs left:")
     for exception, count in sorted(exceptions.items()):
         print(f"{exception:24}{count:10,}")
     return 1 if any(run.violations for run in runs) else 0
