@@ -61,7 +61,7 @@ need_packages() {
     echo "Not a Debian machine. This needs what Debian has in these packages: $*"
     return
   fi
-  for package in "$@"; do
+  for package in $(printf '%s\n' "$@" | sort -u); do
     # A line for each architecture.
     dpkg-query -W -f '${db:Status-Status}\n' "$package" 2>/dev/null | grep -qx installed ||
       missing+=("$package")
