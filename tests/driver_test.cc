@@ -7,7 +7,7 @@ const string at_rest =
     "/usr/share/zoneinfo.default/Asia/Tokyo = zone\n"
     "/usr/share/icu/icutzformat.txt = 44l\n/usr/share/icu/icutz90b.dat = not its format\n"
     "~/zoneinfo -> /usr/share/zoneinfo.default\n~/localtime -> ~/zoneinfo2/None\n"
-    "~/tz/2016a/icutz/icutz44l.dat = older\n~/tz/2016e/icutz/icutz90b.dat = of another format\n"
+    "~/tz/2016a/icutz/icutz44l.dat = older\n~/tz/2016e/icutz/icutz44b.dat = of another format\n"
     "~/tz/2016c/icutz/icutz44l.dat = newer\n~/tz/2016c/zoneinfo/+VERSION = 2015z not its version\n";
 const string version = "/usr/share/zoneinfo.default/+VERSION = ";
 const string on_system = "~/zoneinfo -> /usr/share/zoneinfo.default\n";

@@ -8,7 +8,7 @@ project=$(dirname "$(dirname "$(readlink -f "${BASH_SOURCE[0]}")")")
 build=$(realpath -m "${OLMBOOT_BUILD:-$project/build}")
 
 red='' plain=''
-if [ -t 1 ] && [ -z "${NO_COLOR-}" ] && [ "${TERM-dumb}" != dumb ]; then red=$'\e[31m' plain=$'\e[m'; fi
+if [ -t 1 ] && [ -t 2 ] && [ -z "${NO_COLOR-}" ] && [ "${TERM-dumb}" != dumb ]; then red=$'\e[31m' plain=$'\e[m'; fi
 
 fail() {
   printf '%s: %s\n' "$red$(basename "$0")$plain" "$1" >&2
