@@ -36,6 +36,7 @@ UNIT
   compile_icu "$new/icutz" 2025b 44l
   (cd "$new" && find . -type f -exec sha256sum {} +) >"$device/root/$download.sum"
   chroot "$device" chown -R downloader /home/downloader
+  chmod -R go= "$new"
 
   cp "$package" "$device/tmp"
   quietly "Installing the package" chroot "$device" dpkg -i "/tmp/${package##*/}"
