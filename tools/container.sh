@@ -8,8 +8,7 @@ systemd-nspawn -q -D / --volatile=yes --register=no --keep-unit true >"$log" 2>&
   fail "containers can't start here: $(tail -n 1 "$log")"
 need_packages build-essential cmake debhelper icu-devtools libc-bin libicu-dev mandoc mmdebstrap tzdata
 
-# Makes the system, and names it in $device. Its tree counts as that of release 2025a, older than the pages'
-# download. That lies where its downloader has it.
+# Makes the system, and names it in $device. The pages' download lies where its downloader has it, in $new.
 make_device() {
   build_package
   device=$TMPDIR/device
@@ -42,6 +41,7 @@ UNIT
   quietly "Installing the package" chroot "$device" dpkg -i "/tmp/${package##*/}"
 }
 
+# Makes an image of the device, whose tree counts as that of release 2025a, older than the download.
 make_image() {
   in_image "$device" 'cp -al'
   in_image "$device" America/Los_Angeles
