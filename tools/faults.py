@@ -3,7 +3,7 @@
 
 import argparse
 import collections
-import multiprocessing.pool
+import concurrent.futures
 import os
 import pathlib
 import re
@@ -12,7 +12,6 @@ import signal
 import subprocess
 import sys
 import tempfile
-import threading
 
 STORAGE = "/var/db/timezone/"
 ZONEINFO, ICUTZ, LOCALTIME, LATEST, RECORD = (
@@ -75,24 +74,22 @@ BOOTS = {
 
 
 class Device:
-    """A throw-away root with the program in it."""
+    """A throw-away root with the program and the entries in it."""
 
-    def __init__(self):
-        self.root = pathlib.Path(tempfile.mkdtemp())
+    def __init__(self, entries):
+        self.folder = tempfile.TemporaryDirectory()  # goes with the device
+        self.root = pathlib.Path(self.folder.name)
+        self.trace = self.root / "trace"
         (self.root / "sbin").mkdir()
         shutil.copy(os.environ["OLMBOOT_PROGRAM"], self.root / "sbin/olmboot")
-        self.trace_file = self.root / "trace"
-
-    def put(self, entries):
-        for top in ("usr", "var"):
-            shutil.rmtree(self.root / top, ignore_errors=True)
         for name, what in entries.items():
             path = self.root / name[1:]
-            if what != ABSENT:
-                path.parent.mkdir(parents=True, exist_ok=True)
+            if what == ABSENT:
+                continue
+            path.parent.mkdir(parents=True, exist_ok=True)
             if what.startswith("-> "):
                 path.symlink_to(what[3:])
-            elif what != ABSENT:
+            else:
                 path.write_text(what)
 
     def look(self):
@@ -106,7 +103,7 @@ class Device:
         one on standard output says so. Kills it at the time limit."""
         command = ["setarch", "-R", "chroot", self.root, "/sbin/olmboot"]
         if injection:
-            command = ["strace", "-o", self.trace_file, *injection, *command]
+            command = ["strace", "-o", self.trace, *injection, *command]
         run = subprocess.run(["timeout", "-s", "KILL", TIME_LIMIT, *command],
                              capture_output=True, check=False, text=True)
         # strace has a word to say about an address that 32 bits don't hold.
@@ -114,45 +111,59 @@ class Device:
             line for line in run.stderr.splitlines() if not line.startswith("strace: ")
         ] + ["on standard output: " + line for line in run.stdout.splitlines()]
 
-    def trace(self):
-        return self.trace_file.read_text().splitlines()
+
+# A call's number, name and line in the trace, and what happens to it: an error, or a kill.
+Fault = collections.namedtuple("Fault", "call name line kind injection")
 
 
-Call = collections.namedtuple("Call", "number name line injection")  # the last: of each fault
-
-
-def calls_of(device, start):
-    """The calls that the program makes on the device after the C library's start."""
-    device.put(start)
-    device.boot("-e", "trace=all")
-    calls, seen = [], collections.Counter()
-    for line in device.trace():
+def faults_of(trace):
+    """The faults at each call of the trace after the C library's start."""
+    faults, seen, call = [], collections.Counter(), 0
+    for line in trace.read_text().splitlines()[:-1]:  # without the line that tells the status
         name = line.split("(")[0]
         seen[name] += 1
         # What prepare_process() calls first.
-        if calls or line.startswith("rt_sigaction(SIGPIPE"):
-            faults = {error: f"error={error}" for error in POSSIBLE.get(name, ERRORS)}
-            faults["kill"] = "signal=SIGKILL"
-            calls.append(Call(len(calls) + 1, name, line, {
-                fault: f"inject={name}:{how}:when={seen[name]}" for fault, how in faults.items()}))
-    if not calls:
-        sys.exit("faults: a run must begin with SIGPIPE")
-    return calls[:-1]  # without the line that tells the status
+        if call or line.startswith("rt_sigaction(SIGPIPE"):
+            call += 1
+            for kind in (*POSSIBLE.get(name, ERRORS), "kill"):
+                how = "signal=SIGKILL" if kind == "kill" else f"error={kind}"
+                faults.append(Fault(call, name, line, kind,
+                                    f"inject={name}:{how}:when={seen[name]}"))
+    return faults
+
+
+class Boot:
+    """A boot of a device: its faults, and what one and two undisturbed runs leave."""
+
+    def __init__(self, name):
+        self.start, purpose = BOOTS[name]
+        device = Device(self.start)
+        self.before = device.look()
+        device.boot("-e", "trace=all")
+        self.faults = faults_of(device.trace)
+        if not self.faults:
+            sys.exit("faults: a run must begin with SIGPIPE")
+        once = device.look()
+        for path, what in purpose.items():
+            if once.get(path, ABSENT) != what:
+                sys.exit(f"faults: the boot '{name}' leaves {path} {once.get(path, ABSENT)!r}")
+        device.boot()
+        self.after = device.look()
 
 
 def caveat(run, path, was, found):
     """Returns the case under CAVEATS in olmboot(8) which explains that the boot after a run leaves
     `found` at a path where `was` stood before the fault; None if there is none."""
     def at(*paths):
-        return any(f'"{name}"' in run.call.line for name in paths)
+        return any(f'"{name}"' in run.fault.line for name in paths)
 
-    killed = run.fault == "kill"
+    killed = run.fault.kind == "kill"
     on_download = run.left.get(ZONEINFO) == ON_DOWNLOAD
     if path == RECORD and found == UPDATED[RECORD]:
         return "record names the system"
     if path == RECORD and found in (was, "") and on_download and (
-            killed or at(RECORD) or run.call.name in ("ftruncate", "fstat", "newfstatat")
-            or run.call.name == "write" and "_" in run.call.line):
+            killed or at(RECORD) or run.fault.name in ("ftruncate", "fstat", "newfstatat")
+            or run.fault.name == "write" and "_" in run.fault.line):
         return "record not written"
     if path == ICUTZ and found in (was, ABSENT) and on_download and killed:
         return "ICU link missing or old"
@@ -164,7 +175,7 @@ def caveat(run, path, was, found):
         return "ICU link left over"
     if path == LOCALTIME and found == f"-> {ZONEINFO}/America/Los_Angeles" and (
             LOCALTIME not in run.left if killed
-            else at(LOCALTIME) or ZONEINFO + "/" in run.call.line):
+            else at(LOCALTIME) or ZONEINFO + "/" in run.fault.line):
         return "zone lost"
     return None
 
@@ -172,13 +183,12 @@ def caveat(run, path, was, found):
 class Run:
     """One fault of a boot: what the run left, what the next boot did, and what was wrong."""
 
-    def __init__(self, device, boot, call, fault):
-        self.boot, self.call, self.fault = boot, call, fault
+    def __init__(self, boot, fault):
+        self.boot, self.fault = boot, fault
         self.exceptions, self.violations = [], []
-        device.put(boot.start)
-        self.status, self.lines = device.boot(
-            "-e", f"trace={call.name}", "-e", call.injection[fault])
-        if fault != "kill" and not any("INJECTED" in line for line in device.trace()):
+        device = Device(boot.start)
+        self.status, self.lines = device.boot("-e", f"trace={fault.name}", "-e", fault.injection)
+        if fault.kind != "kill" and "INJECTED" not in device.trace.read_text():
             self.violations.append("the fault did not strike")
         self.left = device.look()
         self.next_status, _ = device.boot()
@@ -188,17 +198,17 @@ class Run:
         self.check_next_boot()
 
     def check_end(self):
-        if self.fault == "kill":
+        if self.fault.kind == "kill":
             if self.status != -signal.SIGKILL:
                 self.violations.append(f"not killed, but status {self.status}")
             return
-        if not self.call.line.startswith("write(2,"):
+        if not self.fault.line.startswith("write(2,"):
             self.violations += [f"this line is not a warning: {line}" for line in self.lines
                                 if not WARNING.fullmatch(line)]
             for line, later in zip(self.lines, self.lines[1:]):
                 if PRIMITIVE.match(line) and not later.endswith(line.split(": ")[-1]):
                     self.violations.append(f"another cause than in the line before: {later}")
-        if self.status == 1 and re.match(f'symlink.*"{LOCALTIME}"', self.call.line):
+        if self.status == 1 and re.match(f'symlink.*"{LOCALTIME}"', self.fault.line):
             self.exceptions.append("status 1")
         elif self.status != 0:
             self.violations.append(f"status {self.status}")
@@ -229,7 +239,8 @@ class Run:
                 self.violations.append(f"the next boot leaves {path} {found!r}")
 
     def show(self):
-        print(self.call.line, f"fault: {self.fault}; status: {self.status}", *self.lines, sep="\n")
+        print(self.fault.line, f"fault: {self.fault.kind}; status: {self.status}", *self.lines,
+              sep="\n")
         for title, earlier, later in (("changed", self.boot.before, self.left),
                                       ("the next boot changed", self.left, self.after)):
             for path in sorted(earlier.keys() | later.keys()):
@@ -237,51 +248,28 @@ class Run:
                     print(f"{title}: {path} {later.get(path, ABSENT)}")
 
 
-class Boot:
-    """A boot of the device `start`: its calls, and what one and two undisturbed runs leave."""
-
-    def __init__(self, device, name):
-        self.start, purpose = BOOTS[name]
-        self.calls = calls_of(device, self.start)
-        device.put(self.start)
-        self.before = device.look()
-        device.boot()
-        once = device.look()
-        for path, what in purpose.items():
-            if once.get(path, ABSENT) != what:
-                sys.exit(f"faults: the boot '{name}' leaves {path} {once.get(path, ABSENT)!r}")
-        device.boot()
-        self.after = device.look()
-
-
 def make_faults(options, name):
     """Makes the chosen faults of a boot happen, prints its row and violations, returns the runs."""
-    boot, runs, local = Boot(Device(), name), [], threading.local()
-    faults = [(call, fault) for call in boot.calls for fault in call.injection
-              if options.call in (None, call.number) and options.fault in (None, fault)]
-
-    def work(fault):
-        if not hasattr(local, "device"):
-            local.device = Device()
-        return Run(local.device, boot, *fault)
-
-    with multiprocessing.pool.ThreadPool(os.cpu_count()) as pool:
-        for run in pool.imap(work, faults):
+    boot, runs = Boot(name), []
+    faults = [fault for fault in boot.faults
+              if options.call in (None, fault.call) and options.fault in (None, fault.kind)]
+    with concurrent.futures.ThreadPoolExecutor(os.cpu_count()) as pool:
+        for run in pool.map(lambda fault: Run(boot, fault), faults):
             runs.append(run)
             if sys.stdout.isatty():
                 print(f"{name}: {len(runs)} of {len(faults)} runs", end="\r", flush=True)
     print_row(name, runs)
     for run in runs:
         for violation in run.violations:
-            print(f"  {violation}\n    tools/faults --boot '{name}' --call {run.call.number} "
-                  f"--fault {run.fault}")
+            print(f"  {violation}\n    tools/faults --boot '{name}' --call {run.fault.call} "
+                  f"--fault {run.fault.kind}")
         if options.call:
             run.show()
     return runs
 
 
 def print_row(name, runs):
-    kills = sum(run.fault == "kill" for run in runs)
+    kills = sum(run.fault.kind == "kill" for run in runs)
     wrong = sum(len(run.violations) for run in runs)
     print(f"{name:24}{len(runs):10,}{len(runs) - kills:10,}{kills:10,}{wrong:12,}", flush=True)
 
