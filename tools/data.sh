@@ -16,14 +16,17 @@ moment='2030-03-15 20:00 UTC'
 # Prints what icuinfo says of $1.
 icu_info() { icuinfo 2>/dev/null | sed -n "s/.*\"$1\">\(.*\)<.*/\1/p"; }
 
-# Compiles the changed tz database into the tree $1 and marks it as release $2.
+# Compiles the changed tz database into the tree $1, as release $2, by the commands of olmboot-image(7).
 compile_tree() {
+  local source=$TMPDIR/source commands
   grep -q "$rule" "$source_of_rules" || fail "the rule to be changed is not in $source_of_rules"
-  mkdir -p "$1"
-  sed "s/$rule/$changed_rule/" "$source_of_rules" >"$1/tzdata.zi"
-  zic -b fat -d "$1" "$1/tzdata.zi"
-  cp "$machine_tree"/{zone1970.tab,zone.tab,iso3166.tab,leapseconds} "$1"
-  echo "$2" >"$1/+VERSION"
+  mkdir -p "$source"
+  touch "$source/zonenow.tab" # Debian 12 has none
+  cp "$machine_tree"/{*.tab,leap*} "$source"
+  sed -i '/^#expires/d' "$source/leapseconds" # an older form, which zic(8) warns of
+  sed "s/$rule/$changed_rule/; s/^# version .*/# version $2/" "$source_of_rules" >"$source/tzdata.zi"
+  commands=$(example olmboot-image.7 'zic -b fat' | sed "/make/d; s,tree=.*,tree=$1,; s,2025b,$2,")
+  (cd "$source" && eval "$commands")
 }
 
 # Compiles ICU's rules, changed in the same way, into the directory $1, as release $2. If there is $3, adds
