@@ -37,8 +37,8 @@ UNIT
   chroot "$device" chown -R downloader /home/downloader
   chmod -R go= "$new"
 
-  cp "$package" "$device/tmp"
-  quietly "Installing the package" chroot "$device" dpkg -i "/tmp/${package##*/}"
+  cp "$package" "$device/root"
+  quietly "Installing the package" chroot "$device" dpkg -i "/root/${package##*/}"
 }
 
 # Makes an image of the device, whose tree counts as that of release 2025a, older than the download.
