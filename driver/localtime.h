@@ -1,9 +1,9 @@
 #pragma once
 
 // Makes sure that the text of the local time link begins with the path of the zoneinfo link. A link
-// for which it does is kept, whatever follows. A link of the older form, into the system partition,
-// is rewritten to the same zone if the active data set has it. Anything else is replaced by a link
-// to America/Los_Angeles.
+// for which it does is kept, whatever follows. One of the older form begins with the path of a tree
+// in the system partition. There that path is replaced by the link's, if what the new text names
+// exists. Anything else is replaced by a link to America/Los_Angeles.
 // To be called once the zoneinfo link is settled.
 // Prints, besides the primitives' lines,
 //   "Correcting localtime link to TARGET"

@@ -5,7 +5,8 @@
 // Otherwise the links are reset to the system data set. Then the newest download is installed and
 // recorded if it is compatible with the system data set and newer than the current one. After
 // a zoneinfo link that names no data set or can't be read, the links are reset, and the decision
-// goes on with the system data set as the current one; any other error ends it with a reset.
+// goes on with the system data set as the current one; any other error ends it with a reset. A file
+// that can't be read is no error: it counts as missing.
 // Prints, besides the lines of what it calls,
 //   "Invalid current symlinks; resetting to system partition"
 //   "Symlink points at data incompatible with installed system"

@@ -31,8 +31,8 @@ case ${1-} in
 esac
 [ $# = 0 ] || [[ $usage == *' '* ]] || refuse "unknown argument '$1'"
 
-# All that a command and what it starts leaves in the temporary directory goes when it ends, however it
-# ends.
+# All that a command and what it starts leaves in the temporary directory goes when it ends, unless by
+# SIGKILL.
 given=${TMPDIR:-/tmp}
 TMPDIR=$(mktemp -d) || fail "name another temporary directory in TMPDIR"
 trap 'rm -rf "$TMPDIR"' EXIT

@@ -14,8 +14,8 @@ inline constexpr filesystem_error no_error_number = -1;
 [[noreturn]] void throw_filesystem_error(filesystem_error error);
 
 // The filesystem operations whose failures are reported alike. Each is one system call on an
-// absolute path. When it fails, it prints one line that ends in the call's error, and throws that
-// as filesystem_error. Nothing is retried and nothing is undone.
+// absolute path. When it fails, all but exists() print one line that ends in the call's error, and
+// throw that as filesystem_error. Nothing is retried and nothing is undone.
 //
 // Always called with the namespace written out, as the C library's remove always is with std::.
 namespace primitive {
