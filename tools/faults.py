@@ -1,7 +1,6 @@
 #!/usr/bin/env python3
 """The work of tools/faults, which starts it, in a directory for throw-away roots. See there."""
 
-import argparse
 import collections
 import concurrent.futures
 import os
@@ -112,23 +111,21 @@ class Device:
         ] + ["on standard output: " + line for line in run.stdout.splitlines()]
 
 
-# A call's number, name and line in the trace, and what happens to it: an error, or a kill.
-Fault = collections.namedtuple("Fault", "call name line kind injection")
+# A call's name and line in the trace, and what happens to it: an error, or a kill.
+Fault = collections.namedtuple("Fault", "name line kind injection")
 
 
 def faults_of(trace):
     """The faults at each call of the trace after the C library's start."""
-    faults, seen, call = [], collections.Counter(), 0
+    faults, seen = [], collections.Counter()
     for line in trace.read_text().splitlines()[:-1]:  # without the line that tells the status
         name = line.split("(")[0]
         seen[name] += 1
         # What prepare_process() calls first.
-        if call or line.startswith("rt_sigaction(SIGPIPE"):
-            call += 1
+        if faults or line.startswith("rt_sigaction(SIGPIPE"):
             for kind in (*POSSIBLE.get(name, ERRORS), "kill"):
                 how = "signal=SIGKILL" if kind == "kill" else f"error={kind}"
-                faults.append(Fault(call, name, line, kind,
-                                    f"inject={name}:{how}:when={seen[name]}"))
+                faults.append(Fault(name, line, kind, f"inject={name}:{how}:when={seen[name]}"))
     return faults
 
 
@@ -239,31 +236,26 @@ class Run:
                 self.violations.append(f"the next boot leaves {path} {found!r}")
 
     def show(self):
-        print(self.fault.line, f"fault: {self.fault.kind}; status: {self.status}", *self.lines,
-              sep="\n")
+        print(f"  fault: {self.fault.kind} at {self.fault.line}", *self.violations,
+              f"status: {self.status}", *self.lines, sep="\n  ")
         for title, earlier, later in (("changed", self.boot.before, self.left),
                                       ("the next boot changed", self.left, self.after)):
             for path in sorted(earlier.keys() | later.keys()):
                 if earlier.get(path) != later.get(path):
-                    print(f"{title}: {path} {later.get(path, ABSENT)}")
+                    print(f"  {title}: {path} {later.get(path, ABSENT)}")
 
 
-def make_faults(options, name):
-    """Makes the chosen faults of a boot happen, prints its row and violations, returns the runs."""
+def disturb(name):
+    """Makes the faults of a boot happen, prints its row, shows violations, returns the runs."""
     boot, runs = Boot(name), []
-    faults = [fault for fault in boot.faults
-              if options.call in (None, fault.call) and options.fault in (None, fault.kind)]
     with concurrent.futures.ThreadPoolExecutor(os.cpu_count()) as pool:
-        for run in pool.map(lambda fault: Run(boot, fault), faults):
+        for run in pool.map(lambda fault: Run(boot, fault), boot.faults):
             runs.append(run)
             if sys.stdout.isatty():
-                print(f"{name}: {len(runs)} of {len(faults)} runs", end="\r", flush=True)
+                print(f"{name}: {len(runs)} of {len(boot.faults)} runs", end="\r", flush=True)
     print_row(name, runs)
     for run in runs:
-        for violation in run.violations:
-            print(f"  {violation}\n    tools/faults --boot '{name}' --call {run.fault.call} "
-                  f"--fault {run.fault.kind}")
-        if options.call:
+        if run.violations:
             run.show()
     return runs
 
@@ -274,19 +266,14 @@ def print_row(name, runs):
 
 
 def main():
-    parser = argparse.ArgumentParser(prog="faults", usage=argparse.SUPPRESS, add_help=False)
-    parser.add_argument("--boot", choices=BOOTS)
-    parser.add_argument("--call", type=int)
-    parser.add_argument("--fault", choices=(*ERRORS, "kill"))
-    options = parser.parse_args()
+    names = sys.argv[1:] or list(BOOTS)
+    if set(names) - BOOTS.keys():
+        print("faults: there is no such boot; --help tells more", file=sys.stderr)
+        return 2
     if "OLMBOOT_PROGRAM" not in os.environ:
         return 0  # asked about the arguments alone
     print("boot                          runs  violations")
-    runs = []
-    for name in [options.boot] if options.boot else BOOTS:
-        runs += make_faults(options, name)
-    if not runs:
-        parser.error("no boot has that call and fault")
+    runs = [run for name in names for run in disturb(name)]
     print_row("all", runs)
     exceptions = collections.Counter(name for run in runs for name in run.exceptions)
     if exceptions:
