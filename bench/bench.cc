@@ -68,7 +68,6 @@ void rewind(boot kind) {
   if (kind == boot::update) {
     put_link(storage / "zoneinfo", "/usr/share/zoneinfo.default");
     fs::remove(storage / "icutz");
-    fs::remove(storage / "TZVersionDiffRecord");
   } else {
     put_link(storage / "zoneinfo", newest / "zoneinfo");
     put_link(storage / "icutz", newest / "icutz");
@@ -92,6 +91,9 @@ double time_of(const char* path, boot kind) {
   const std::chrono::duration<double> time = std::chrono::steady_clock::now() - start;
   posix_spawn_file_actions_destroy(&actions);
   if (status != 0) errx(EXIT_FAILURE, "%s has ended with wait status %d", path, status);
+  const bool updated = fs::remove("/var/db/timezone/TZVersionDiffRecord");
+  if (updated != (kind == boot::update))
+    errx(EXIT_FAILURE, "%s was not the boot '%s'", path, name_of(kind));
   return time.count();
 }
 
