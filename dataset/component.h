@@ -5,8 +5,8 @@
 // One kind of data in a data set, and the system-wide link for that kind. A component is complete
 // when its constructor returns and never changes. Destroying it changes nothing on disk.
 //
-// A component is made as its own type and handed at once to a std::shared_ptr of this one, which
-// remembers the type to destroy. The protected destructor refuses what would destroy only this part
+// A component is made as its own type and kept by a std::shared_ptr to this one, which remembers the
+// type to destroy. The protected destructor refuses what would destroy only this part
 // of it: a delete through a pointer to this type.
 class olm_dataset_component {
  public:
