@@ -5,9 +5,9 @@
 // One kind of data in a data set, and the system-wide link for that kind. A component is complete
 // when its constructor returns and never changes. Destroying it changes nothing on disk.
 //
-// A component is made as its own type and kept by a std::shared_ptr to this one, which remembers the
-// type to destroy. The protected destructor refuses what would destroy only this part
-// of it: a delete through a pointer to this type.
+// A component is made as its own type and kept by a std::shared_ptr to this one, which remembers
+// the type to destroy. The protected destructor refuses what would destroy only this part of it: a
+// delete through a pointer to this type.
 class olm_dataset_component {
  public:
   // Returns whether this component's data is compatible with that of `other`, the component of
