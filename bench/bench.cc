@@ -145,11 +145,12 @@ int main(int argc, char** argv) {
   const char* const root = std::getenv("OLMBOOT_ROOT");
   if (root == nullptr || chdir(root) != 0 || chroot(".") != 0 || !fs::exists("/throw-away"))
     errx(EXIT_FAILURE, "not in a throw-away root; use tools/bench");
-  if (argc > 1) {
+  if (argc > 1 && std::string(argv[1]) == "device") {
     make_device(1, 1);
     rewind(boot::update);
     return EXIT_SUCCESS;
   }
+  if (benchmark::ReportUnrecognizedArguments(argc, argv)) return EXIT_FAILURE;
   for (const boot kind : {boot::update, boot::again}) {
     auto* const series = benchmark::RegisterBenchmark(name_of(kind), time_boots, kind);
     series->ArgNames({"data_sets", "ICU_files"})->Iterations(500)->UseManualTime();
