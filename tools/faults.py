@@ -75,12 +75,14 @@ BOOTS = {
 class Device:
     """A throw-away root with the program and the entries in it."""
 
+    program = None  # a copy: one that is still written, by any thread, could not be started
+
     def __init__(self, entries):
         self.folder = tempfile.TemporaryDirectory()  # goes with the device
         self.root = pathlib.Path(self.folder.name)
         self.trace = self.root / "trace"
         (self.root / "sbin").mkdir()
-        shutil.copy(os.environ["OLMBOOT_PROGRAM"], self.root / "sbin/olmboot")
+        os.link(Device.program, self.root / "sbin/olmboot")
         for name, what in entries.items():
             path = self.root / name[1:]
             if what == ABSENT:
@@ -272,6 +274,7 @@ def main():
         return 2
     if "OLMBOOT_PROGRAM" not in os.environ:
         return 0  # asked about the arguments alone
+    Device.program = shutil.copy(os.environ["OLMBOOT_PROGRAM"], tempfile.mkdtemp())
     print("boot                          runs  violations")
     runs = [run for name in names for run in disturb(name)]
     print_row("all", runs)
