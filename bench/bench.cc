@@ -157,6 +157,5 @@ int main(int argc, char** argv) {
     series->Args({1, 1})->Args({100, 1})->Args({10000, 1})->Args({1, 100})->Args({1, 10000});
   }
   table rows;
-  benchmark::RunSpecifiedBenchmarks(&rows);
-  return EXIT_SUCCESS;
+  return benchmark::RunSpecifiedBenchmarks(&rows) > 0 ? EXIT_SUCCESS : EXIT_FAILURE;
 }
