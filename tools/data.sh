@@ -20,12 +20,13 @@ icu_info() { icuinfo 2>/dev/null | sed -n "s/.*\"$1\">\(.*\)<.*/\1/p"; }
 compile_tree() {
   local source=$TMPDIR/source commands
   grep -q "$rule" "$source_of_rules" || fail "the rule to be changed is not in $source_of_rules"
-  mkdir -p "$source"
+  mkdir -p "$source" "$1"
+  ln -sfn "$1" "$source/tree"
   touch "$source/zonenow.tab" # Debian 12 has none
   cp "$machine_tree"/{*.tab,leap*} "$source"
   sed -i '/^#expires/d' "$source/leapseconds" # an older form, which zic(8) warns of
   sed "s/$rule/$changed_rule/; s/^# version .*/# version $2/" "$source_of_rules" >"$source/tzdata.zi"
-  commands=$(example olmboot-image.7 'zic -b fat' | sed "/make/d; s,tree=.*,tree=$1,; s,2025b,$2,")
+  commands=$(example olmboot-image.7 'zic -b fat' | sed "/make/d; s/tree=.*/tree=tree/; s/2025b/$2/")
   (cd "$source" && eval "$commands")
 }
 
