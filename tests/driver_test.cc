@@ -94,9 +94,9 @@ const boot_case cases[] = {
      "No ICU schema found for ~/tz/2016f\n" + refused("2016f", "2016b.1.0") + zone_reset,
      default_zone},
     {"download_of_no_version_that_is_gone_and_old_zone_link_to_no_zone",
-     "~/tz_latest -> ~/tz/x\n~/localtime -> /usr/share/zoneinfo/Asia/Tokyo/None\n",
-     unparsed("x") + "No ICU schema found for ~/tz/x\n" + refused("x", "2016b.1.0") +
-         correcting("~/zoneinfo/Asia/Tokyo/None") + zone_reset,
+     "~/tz_latest -> ~/tz/x/2016f\n~/localtime -> /usr/share/zoneinfo/Asia/Tokyo/None\n",
+     unparsed("x/2016f") + "No ICU schema found for ~/tz/x/2016f\n" +
+         refused("x/2016f", "2016b.1.0") + correcting("~/zoneinfo/Asia/Tokyo/None") + zone_reset,
      default_zone},
     {"no_version_and_old_ICU_link_to_itself", version + "\n/var/db/icutz -> icutz\n",
      unparsed(".1.0") + unparsed(".1.0")},  // no data set is made for an absent latest link
